@@ -1,0 +1,74 @@
+// Typed access to JSON values, and JSON texts and files.
+#pragma once
+
+#include <json/value.h>
+#include <sys/types.h>
+
+#include <string>
+#include <vector>
+
+#include "appindex/export.h"
+
+namespace velkor {
+
+// Type test and conversion for T = std::string, bool, int, unsigned int, long long and double; no
+// other type is supported. The test is the JSON library's own convertibility (a number or a bool
+// passes as a string, null passes as anything); only long long wants exactly an integer. Convert
+// only what passed the test: otherwise the JSON library throws its own exception.
+template <typename T>
+TEISEIGATRO_EXPORT bool isJsonType(const Json::Value& value);
+template <typename T>
+TEISEIGATRO_EXPORT T asJsonType(const Json::Value& value);
+
+// Reads member `key` of `obj` into `out`, for the types above and for Json::Value, which is copied
+// as it stands. An optional member (`required` false) that is missing or of another type leaves
+// `out` untouched: preset it to the default.
+//
+// Throws Error 120, with `out` untouched, for an `obj` that is not an object ("Not an object"), and
+// for a required member that is missing ("Missing property: " and the key) or of another type ("Not
+// a string", whatever type was asked for). Each reason ends in the JSON text of `obj`.
+template <typename T>
+TEISEIGATRO_EXPORT void GetJsonValue(T& out, const Json::Value& obj, const std::string& key,
+                                     bool required);
+
+// Merges `changes` into `target`, member by member: null removes the member, an object is merged
+// into it, anything else replaces it. `changes` that is not an object changes nothing. Where an
+// object meets a member that is neither an object nor null, the JSON library's own exception is
+// thrown, and the members before it stay changed.
+TEISEIGATRO_EXPORT void JsonApplyChanges(Json::Value& target, const Json::Value& changes);
+
+// ", data=" and the JSON text of `value`: the end of every message above.
+TEISEIGATRO_EXPORT std::string AppendData(const Json::Value& value);
+
+// A JSON array of the strings, in order. T is std::string.
+template <typename T>
+TEISEIGATRO_EXPORT Json::Value Vec2JsonArr(const std::vector<T>& items);
+
+// The elements of an array, or the member values of an object, that can be made into text, in
+// order; the others are left out. Empty for any other value. T is std::string.
+template <typename T>
+TEISEIGATRO_EXPORT std::vector<T> JsonArr2Vec(const Json::Value& value);
+
+// Parses `text` as one JSON value of any type, strictly: no comments, no trailing comma, no member
+// named twice, no byte order mark, nothing but white space behind the value, no NUL byte, nested at
+// most 127 levels deep. Returns false, with `value` untouched, when the text is not that. Never
+// throws for a text; runs in the stack of a small thread (256 KiB).
+TEISEIGATRO_EXPORT bool fromString(Json::Value& value, const std::string& text);
+
+// The JSON text of `value`, on one line, in UTF-8. Where a text in it is not UTF-8, the whole
+// result is ASCII, with other characters escaped and the wrong bytes as U+FFFD: it is valid JSON in
+// any case.
+TEISEIGATRO_EXPORT std::string toString(const Json::Value& value);
+
+// Reads and parses a whole file as fromString does. Returns false, with `value` untouched, when the
+// file is missing, unreadable, not a regular file, larger than 16 MiB or not JSON; errno tells why
+// it could not be read. Follows links. Never hangs on a FIFO.
+TEISEIGATRO_EXPORT bool fromFile(Json::Value& value, const std::string& path);
+
+// Replaces the file at `path` with the JSON text of `value`, with exactly the permission bits
+// `mode`: after a crash there is the old file or the new one. Blocks until the content is on disk.
+// Returns false, with errno telling why and nothing left behind, when that cannot be done.
+TEISEIGATRO_EXPORT bool toFile(const Json::Value& value, const std::string& path,
+                               mode_t mode = 0644);
+
+}  // namespace velkor

@@ -1,0 +1,39 @@
+#include "common/check.h"
+
+#include <syslog.h>
+#include <unistd.h>
+
+#include <cstring>
+
+namespace velkor {
+
+void LogFailureText(const CheckSite& site, const std::string& text) {
+  const int failed_with = errno;
+  const std::string suffix =
+      failed_with == 0 ? "" : " [err: " + std::string(std::strerror(failed_with)) + "]";
+  syslog(LOG_ERR, "%s:%d (%d, %u) (%s) %s%s", site.module, site.line, getpid(), geteuid(),
+         site.function, text.c_str(), suffix.c_str());
+  errno = 0;  // also what syslog itself left, such as ENOENT where no log daemon listens
+}
+
+void LogFailure(bool ok, const CheckSite& site, const char* condition) {
+  if (!ok) LogFailureText(site, "Failed [" + std::string(condition) + "]");
+}
+
+void LogNotice(const char* module, int line, const std::string& text) {
+  const int kept = errno;
+  syslog(LOG_ERR, "%s:%d %s", module, line, text.c_str());
+  errno = kept;
+}
+
+void LogFailedCheck(const CheckSite& site, const char* condition, const Error& error) {
+  LogFailureText(site, "Failed [" + std::string(condition) + "], reason: " + error.what());
+}
+
+void CheckOrThrow(bool ok, const CheckSite& site, const char* condition, Error::ErrorCode code) {
+  if (ok) return;
+  LogFailedCheck(site, condition, Error(code));
+  throw Error(code);
+}
+
+}  // namespace velkor
