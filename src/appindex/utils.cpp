@@ -1,0 +1,70 @@
+#include <boost/regex.hpp>
+
+#include "appindex/device_identity.h"
+#include "appindex/utils_internal.h"
+#include "common/check.h"
+#include "device/tovo_config.h"
+
+namespace velkor::appindex {
+namespace {
+
+constexpr char kModule[] = "utils";
+constexpr char kTovoInfoPath[] = "/etc/tovoinfo.conf";
+constexpr char kUniqueKey[] = "unique";
+constexpr int kUniqueBytes = 256;
+
+const std::set<std::string> kSupportedLangs = {"enu", "cht", "chs", "csy", "jpn", "krn", "dan",
+                                               "fre", "ger", "ita", "nld", "nor", "plk", "rus",
+                                               "spn", "sve", "hun", "trk", "ptg", "ptb", "tha"};
+
+std::string platform;
+std::string model;
+
+bool IsListed(const Json::Value& filter, const char* member, const std::string& name) {
+  const Json::Value& names = filter[member];
+  if (!names.isArray()) return false;
+  for (const Json::Value& element : names) {
+    if (element.isString() && element.asString() == name) return true;
+  }
+  return false;
+}
+
+}  // namespace
+
+void PrepareModelAndPlatform() {
+  char buf[kUniqueBytes] = {};
+  CheckOrThrow(TLIBCFileGetKeyValue(kTovoInfoPath, kUniqueKey, buf, kUniqueBytes, 0) >= 0,
+               {kModule, 33, "PrepareModelAndPlatform"},
+               "0 > TLIBCFileGetKeyValue(SZF_TOVO_INFO, SZ_HB_UNIQUE, buf, sizeof(buf), 0)",
+               Error::kGeneralError, [] { return "Failed to get unique"; });
+
+  const std::string unique = buf;
+  static const boost::regex reg("marovant_([^_]*)_(.*)");
+  boost::smatch sm;
+  CheckOrThrow(boost::regex_search(unique, sm, reg), {kModule, 42, "PrepareModelAndPlatform"},
+               "!boost::regex_search(unique, sm, reg)", Error::kGeneralError,
+               [&unique] { return "Malformed hb unique: " + unique; });
+  platform = sm[1];
+  model = sm[2];
+}
+
+const std::set<std::string>& GetSupportedLangs() { return kSupportedLangs; }
+
+const std::string& GetPlatform() {
+  if (platform.empty()) PrepareModelAndPlatform();
+  return platform;
+}
+
+const std::string& GetModel() {
+  if (model.empty()) PrepareModelAndPlatform();
+  return model;
+}
+
+bool IsPassFilter(const Json::Value& filter, bool pass_value) {
+  if (!filter.isObject()) return true;
+  if (filter.isMember("model") && IsListed(filter, "model", GetModel())) return pass_value;
+  if (filter.isMember("platform") && IsListed(filter, "platform", GetPlatform())) return pass_value;
+  return !pass_value;
+}
+
+}  // namespace velkor::appindex
