@@ -1,0 +1,178 @@
+#include "appindex/elastic_control.h"
+
+#include <unistd.h>
+
+#include <algorithm>
+#include <cstdlib>
+#include <iterator>
+
+#include "appindex/elastic_control_internal.h"
+#include "appindex/utilities/json_helpers.h"
+#include "common/check.h"
+#include "device/tovodaemon.h"
+
+namespace velkor::appindex::elastic {
+namespace {
+
+constexpr char kModule[] = "elastic_control";
+constexpr long kElasticdConnectTimeout = 864000;  // ten days, in seconds
+constexpr int kMaxSocketChecks = 16;
+constexpr unsigned kSocketPauseSeconds = 1;
+
+// 609 lies between them and is a real failure.
+constexpr int kDaemonDbNotReady[] = {607, 608, 610};
+constexpr unsigned kNotReadyPauseSeconds = 30;
+constexpr int kBusyMinMinutes = 15;
+constexpr int kBusyMinuteSteps = 5;
+constexpr unsigned kSecondsPerMinute = 60;
+
+constexpr char kIndexIdPrefix[] = "appindex_";
+constexpr char kIndexStorageDir[] = "/var/packages/Velkor/etc/appindex.db/";
+
+// "white space" is spelled with the blank: so the daemon names that analyzer.
+constexpr char kAppIndexMappings[] = R"({
+  "property_id": "id",
+  "default": {
+    "type": "string",
+    "analyzer": "tovostandard",
+    "required": false,
+    "stored": true,
+    "_all": true
+  },
+  "properties": {
+    "id": {"analyzer": "keyword", "required": true, "_all": false},
+    "owner": {"analyzer": "keyword", "_all": false},
+    "title": {"type": "text"},
+    "desc": {"type": "text"},
+    "keywords": {"type": "text"},
+    "search_title": {
+      "type": "text",
+      "analyzer": "white space",
+      "preprocess": ["tolower", "ngram"]
+    }
+  }
+})";
+
+// Gives up in silence: the connect that follows fails and says so.
+void WaitForSocket() {
+  for (int failed = 1; access(kElasticdSockPath, F_OK) != 0 && failed < kMaxSocketChecks;
+       ++failed) {
+    LogNotice(kModule, 74, "elastic socket is not ready, retry ... " + std::to_string(failed));
+    sleep(kSocketPauseSeconds);
+  }
+}
+
+bool IsReply(const Json::Value& reply) {
+  return reply.isObject() && reply.isMember("success") && reply["success"].isBool();
+}
+
+[[noreturn]] void ThrowDaemonError(const Json::Value& response, const std::string& request_text) {
+  const Json::Value& error = response["error"];
+  int code = 0;
+  std::string msg;
+  GetJsonValue(code, error, "code", true);
+  GetJsonValue(msg, error, "msg", true);
+  LogFailureText({kModule, 94, "SendRequestImpl"}, "Request failed: " + request_text);
+  throw Error(code, "Request failed, msg=" + msg);
+}
+
+// Pauses before the next attempt when the daemon's answer is one that passes by itself.
+bool PauseForRetry(int code) {
+  if (std::count(std::begin(kDaemonDbNotReady), std::end(kDaemonDbNotReady), code) != 0) {
+    LogNotice(kModule, 108,
+              "DB is not good yet, retry... (Error Code: " + std::to_string(code) + ")");
+    sleep(kNotReadyPauseSeconds);
+    return true;
+  }
+  if (code == Error::kDaemonBusy) {
+    LogNotice(kModule, 114, "Retry since tovoelasticd is busy");
+    sleep(static_cast<unsigned>(rand() % kBusyMinuteSteps + kBusyMinMinutes) * kSecondsPerMinute);
+    return true;
+  }
+  return false;
+}
+
+Json::Value MakeRequest(const char* command, const std::string& lang) {
+  Json::Value request(Json::objectValue);
+  request["command"] = command;
+  request["data"]["id"] = GetAppIndexID(lang);
+  return request;
+}
+
+}  // namespace
+
+void SendRequestImpl(Json::Value& response, const Json::Value& request) {
+  WaitForSocket();
+
+  const std::string request_text = toString(request);
+  tovodaemon::DomainSockConnection conn(kElasticdSockPath);
+  CheckOrThrow(conn.Connect(kElasticdConnectTimeout), {kModule, 84, "SendRequestImpl"},
+               "!conn.Connect(kElasticdConnectTimeout)", Error::kElasticdRequestError,
+               [&] { return "Connect failed, req=" + request_text; });
+  CheckOrThrow(conn.Send(request_text), {kModule, 86, "SendRequestImpl"},
+               "!conn.Send(req.toString())", Error::kElasticdRequestError,
+               [&] { return "Send failed, req=" + request_text; });
+  std::string reply;
+  CheckOrThrow(conn.Recv(reply) && fromString(response, reply) && IsReply(response),
+               {kModule, 89, "SendRequestImpl"},
+               "!conn.Recv(resp_raw) || !res.fromString(resp_raw) || !res.isMember(\"success\") || "
+               "!res[\"success\"].isBool()",
+               Error::kElasticdRequestError, [&] { return "Recv failed, req=" + request_text; });
+  if (!response["success"].asBool()) ThrowDaemonError(response, request_text);
+  conn.Disconnect();
+}
+
+void SendRequest(const Json::Value& request) {
+  Json::Value response;
+  for (;;) {
+    try {
+      SendRequestImpl(response, request);
+      return;
+    } catch (const Error& error) {
+      if (!PauseForRetry(error.code)) throw;
+    }
+  }
+}
+
+Json::Value GetAppIndexMappings(const std::string& mappings) {
+  Json::Value ret;
+  CheckOrThrow(fromString(ret, mappings), {kModule, 58, "GetAppIndexMappings"},
+               "!ret.fromString(mappings)", Error::kGeneralError);
+  return ret;
+}
+
+Json::Value GetAppIndexMappings() { return GetAppIndexMappings(kAppIndexMappings); }
+
+std::string GetAppIndexID(const std::string& lang) { return kIndexIdPrefix + lang; }
+
+void AppIndexCreate(const std::string& lang) {
+  Json::Value request = MakeRequest("index_create", lang);
+  request["data"]["path"] = kIndexStorageDir + lang;
+  request["data"]["settings"] = Json::Value(Json::objectValue);
+  request["data"]["mappings"] = GetAppIndexMappings();
+  SendRequest(request);
+}
+
+void AppIndexDelete(const std::string& lang) { SendRequest(MakeRequest("index_delete", lang)); }
+
+void IndexUpsert(const std::string& lang, const Json::Value& doc) {
+  Json::Value doc_id;
+  GetJsonValue(doc_id, doc, "id", true);
+  // A number is a text by the JSON library's rule, but never a document's key.
+  if (!doc_id.isString()) throw Error(Error::kJsonError, "Not a string" + AppendData(doc));
+
+  Json::Value request = MakeRequest("document_upsert_by_id", lang);
+  request["data"]["doc_id"] = doc_id;
+  request["data"]["data"] = doc;
+  SendRequest(request);
+}
+
+void IndexDelete(const std::string& lang, const std::string& doc_id) {
+  Json::Value request = MakeRequest("document_del_by_id", lang);
+  request["data"]["doc_id"] = doc_id;
+  SendRequest(request);
+}
+
+void IndexCommit(const std::string& lang) { SendRequest(MakeRequest("commit", lang)); }
+
+}  // namespace velkor::appindex::elastic

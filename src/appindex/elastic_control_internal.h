@@ -1,0 +1,27 @@
+// Internal seams of the module elastic_control: one exchange with the search daemon, the same with
+// its retries, and the schema of an app index.
+#pragma once
+
+#include <json/value.h>
+
+#include <string>
+
+namespace velkor::appindex::elastic {
+
+constexpr char kElasticdSockPath[] = "/var/run/tovoelasticd.sock";
+
+// Sends one request on a connection of its own and puts the daemon's reply into `response` when it
+// reports success; otherwise throws Error 913 (transport), the daemon's own code, or 120 (a failure
+// reply without code or text). `response` is untouched when no reply could be parsed.
+void SendRequestImpl(Json::Value& response, const Json::Value& request);
+
+// The same, again and again while the daemon answers that its database is not ready or that it is
+// busy. The reply is dropped.
+void SendRequest(const Json::Value& request);
+
+// The schema of an app index as the daemon is told it. Throws Error 502, logged, when `mappings` is
+// not JSON.
+Json::Value GetAppIndexMappings(const std::string& mappings);
+Json::Value GetAppIndexMappings();
+
+}  // namespace velkor::appindex::elastic
