@@ -1,0 +1,123 @@
+// Descriptors: where they lie and what they declare.
+#include <utility>
+
+#include "appindex/device_identity.h"
+#include "appindex/index_mgr_internal.h"
+#include "appindex/utilities/file_utils.h"
+#include "appindex/utilities/json_helpers.h"
+#include "common/check.h"
+#include "common/dir_reader.h"
+
+namespace velkor::appindex {
+namespace {
+
+constexpr unsigned kMaxSearchDepth = 5;
+constexpr char kModuleIdSeparator[] = "?";
+
+const std::set<std::string> kAppRoots = {"/var/packages/", "/usr/tovo/tovoman/webman/modules/"};
+const std::set<std::string> kNoApplications = {".", "..", "Docuvault"};
+
+void LogMalformed(const std::string& conf_path) {
+  LogFailureText({kIndexMgr, 36, "FindIndexables"}, "Malformed index.conf: " + conf_path);
+}
+
+bool IsForThisDevice(const Json::Value& item) {
+  return IsPassFilter(item["enable"], true) && IsPassFilter(item["disable"], false);
+}
+
+// What an entry and a module have in common.
+Json::Value MakeRecord(const std::string& conf_path, const Json::Value& item,
+                       const Json::Value& entry) {
+  Json::Value record(Json::objectValue);
+  record["path"] = conf_path;
+  record["title"] = item["title"];
+  record["desc"] = item["desc"];
+  record["keywords"] = item["keywords"];
+  record["stringset"] = entry["stringset"];
+  return record;
+}
+
+void AppendModule(Json::Value& records, const std::string& conf_path, const Json::Value& module,
+                  const Json::Value& entry) {
+  if (!module.isObject() || !IsForThisDevice(module)) return;
+  const Json::Value& app = entry["app"];
+  const Json::Value& params = module["params"];
+  if (!isJsonType<std::string>(app) || !isJsonType<std::string>(params)) {
+    LogMalformed(conf_path);
+    return;
+  }
+  Json::Value record = MakeRecord(conf_path, module, entry);
+  record["id"] = app.asString() + kModuleIdSeparator + params.asString();
+  record["owner"] = app;
+  records.append(std::move(record));
+}
+
+void AppendEntry(Json::Value& records, const std::string& conf_path, const Json::Value& entry) {
+  if (!entry.isObject() || !IsForThisDevice(entry)) return;
+  Json::Value record = MakeRecord(conf_path, entry, entry);
+  record["id"] = entry["app"];
+  record["owner"] = "";
+  records.append(std::move(record));
+  for (const Json::Value& module : entry["modules"]) {
+    AppendModule(records, conf_path, module, entry);
+  }
+}
+
+}  // namespace
+
+Json::Value FindIndexables(const std::string& conf_path) {
+  Json::Value records(Json::arrayValue);
+  Json::Value root;
+  if (!fromFile(root, conf_path)) {
+    LogMalformed(conf_path);
+    return records;
+  }
+  if (root.isObject()) {
+    AppendEntry(records, conf_path, root);
+  } else {
+    for (const Json::Value& entry : root) AppendEntry(records, conf_path, entry);
+  }
+  return records;
+}
+
+bool FindIndexConfByAppRoot(std::string& conf_path, const std::string& find_dir, unsigned depth) {
+  DirReader dir(find_dir);
+  CheckOrThrow(dir.IsOpen(), {kIndexMgr, 100, "FindIndexConfByAppRoot"},
+               "nullptr == (dir = opendir(find_dir.c_str()))", Error::kGeneralError,
+               [&find_dir] { return "opendir failed, path=" + find_dir; });
+  std::string name;
+  while (dir.Next(name)) {
+    const std::string child = find_dir + name;
+    if (name == kIndexConf) {
+      conf_path = child;
+      return true;
+    }
+    if (depth < kMaxSearchDepth && IsDirExist(child, true) &&
+        FindIndexConfByAppRoot(conf_path, child + "/", depth + 1)) {
+      return true;
+    }
+  }
+  return false;
+}
+
+std::set<std::string> FindIndexConf() {
+  std::set<std::string> conf_paths;
+  for (const std::string& root : kAppRoots) {
+    DirReader dir(root);
+    CheckOrThrow(dir.IsOpen(), {kIndexMgr, 130, "FindIndexConf"},
+                 "nullptr == (dir = opendir(root.c_str()))", Error::kGeneralError,
+                 [&root] { return "opendir failed, path=" + root; });
+    std::string name;
+    while (dir.Next(name)) {
+      if (kNoApplications.count(name) != 0) continue;
+      const std::string app_dir = root + name + "/";
+      std::string conf_path;
+      if (IsDirExist(app_dir, false) && FindIndexConfByAppRoot(conf_path, app_dir, 0)) {
+        conf_paths.insert(conf_path);
+      }
+    }
+  }
+  return conf_paths;
+}
+
+}  // namespace velkor::appindex

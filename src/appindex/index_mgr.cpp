@@ -1,0 +1,88 @@
+// The way of an application into the index and out of it: its descriptor gives records, each record
+// gives a document per language, each document is upserted, each language committed.
+#include "appindex/index_mgr.h"
+
+#include <sys/stat.h>
+#include <unistd.h>
+
+#include "appindex/config.h"
+#include "appindex/device_identity.h"
+#include "appindex/elastic_control.h"
+#include "appindex/error.h"
+#include "appindex/index_mgr_internal.h"
+#include "appindex/utilities/file_utils.h"
+#include "common/check.h"
+
+namespace velkor::appindex {
+namespace {
+
+constexpr char kIndexDbDir[] = "/var/packages/Velkor/etc/appindex.db/";
+constexpr mode_t kIndexDbMode = 0700;
+
+// Leaves the daemon time for searches between two writes, also between a last and a next first one.
+constexpr useconds_t kUpsertPauseMicroseconds = 10000;
+
+StringPool string_pool;
+
+void AddInEveryLanguage(const std::string& conf_path, bool commit) {
+  for (const std::string& lang : GetSupportedLangs()) {
+    for (const Json::Value& record : FindIndexables(conf_path)) {
+      const Json::Value doc = MakeDocument(string_pool, lang, record);
+      usleep(kUpsertPauseMicroseconds);
+      elastic::IndexUpsert(lang, doc);
+    }
+    if (commit) elastic::IndexCommit(lang);
+  }
+}
+
+void RecreateIndex(const std::string& lang) {
+  try {
+    elastic::AppIndexDelete(lang);
+  } catch (const Error& error) {
+    if (error.code != Error::kDaemonIndexMissing) throw;
+  }
+  elastic::AppIndexCreate(lang);
+}
+
+}  // namespace
+
+void Add(const std::string& conf_path, bool commit) {
+  if (Basename(conf_path) != kIndexConf) return;
+  LogNotice(kIndexMgr, 190, "Add: " + conf_path);
+  try {
+    AddInEveryLanguage(conf_path, commit);
+    return;
+  } catch (const Error& error) {
+    if (error.code != Error::kDaemonIndexMissing) throw;
+  }
+  LogFailureText({kIndexMgr, 245, "Add"}, "Do reindex to recover missing indices");
+  Reindex();
+}
+
+void Del(const std::string& conf_path, bool commit) {
+  if (Basename(conf_path) != kIndexConf) return;
+  LogNotice(kIndexMgr, 255, "Del: " + conf_path);
+  for (const std::string& lang : GetSupportedLangs()) {
+    for (const Json::Value& record : FindIndexables(conf_path)) {
+      elastic::IndexDelete(lang, record["id"].asString());
+    }
+    if (commit) elastic::IndexCommit(lang);
+  }
+}
+
+void Reindex() {
+  // Everything that may be missing or unreadable is looked at before anything is deleted.
+  const std::set<std::string> conf_paths = FindIndexConf();
+  Config config;
+  LogNotice(kIndexMgr, 290, "Reindex app");
+
+  mkdir(kIndexDbDir, kIndexDbMode);  // there already, as a rule
+  for (const std::string& lang : GetSupportedLangs()) RecreateIndex(lang);
+  for (const std::string& conf_path : conf_paths) Add(conf_path, false);
+  for (const std::string& lang : GetSupportedLangs()) elastic::IndexCommit(lang);
+
+  config.indexed_version = config.GetCurrentVersion();
+  config.Save();
+}
+
+}  // namespace velkor::appindex

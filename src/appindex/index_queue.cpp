@@ -1,0 +1,117 @@
+// The work queue: requests that other programs leave in a file, one JSON object a line.
+#include <cxxabi.h>
+#include <unistd.h>
+
+#include <cerrno>
+#include <cstdio>
+#include <cstring>
+#include <limits>
+#include <map>
+#include <sstream>
+
+#include "appindex/elastic_control_internal.h"
+#include "appindex/error.h"
+#include "appindex/index_mgr.h"
+#include "appindex/index_mgr_internal.h"
+#include "appindex/utilities/file_utils.h"
+#include "appindex/utilities/json_helpers.h"
+#include "appindex/utilities/lock_file.h"
+#include "common/check.h"
+#include "common/file_io.h"
+
+namespace velkor::appindex {
+namespace {
+
+constexpr char kProcessLockPath[] = "/tmp/velkor_appindex_process.lck";
+constexpr char kQueuePath[] = "/var/packages/Velkor/etc/appindex.queue";
+
+// The numbers stand in the file.
+enum Operation { kAdd = 1, kDel = 2, kReindex = 3 };
+
+// By descriptor path. A std::map keeps its keys in byte order, and the requests without a path,
+// rebuilds as a rule, come first.
+using Batch = std::map<std::string, int>;
+
+// Moves the live queue aside, while no writer is in the middle of a line.
+void TakeQueue(const std::string& queue_path, const std::string& queue_path_tmp) {
+  const LockFile queue_lock(queue_path, true);
+  CheckOrThrow(rename(queue_path.c_str(), queue_path_tmp.c_str()) == 0,
+               {kIndexMgr, 330, "ProcessQueue"},
+               "0 > rename(queue_path.c_str(), queue_path_tmp.c_str())", Error::kGeneralError,
+               [] { return std::string("rename failed, reason=") + std::strerror(errno); });
+}
+
+void ReadRequest(Batch& batch, const std::string& line) {
+  Json::Value request;
+  if (!fromString(request, line)) return;
+  int op = 0;
+  GetJsonValue(op, request, "op", true);
+  // What merely converts to an integer, such as true or 1.5, is no operation.
+  if (!request["op"].isInt()) throw Error(Error::kJsonError, "Not a string" + AppendData(request));
+  Json::Value path;
+  GetJsonValue(path, request, "path", false);
+  batch[path.isString() ? path.asString() : ""] = op;
+}
+
+// A request that cannot be read is logged and skipped: it must not hold up the others.
+void ReadLine(Batch& batch, const std::string& line) {
+  constexpr CheckSite kBadRequest = {kIndexMgr, 350, "ProcessQueue"};
+  constexpr CheckSite kFailedRequest = {kIndexMgr, 353, "ProcessQueue"};
+  const std::string failure = "ProcessQueue failed, cmd: " + line;
+  try {
+    ReadRequest(batch, line);
+  } catch (const Error& error) {
+    LogFailureText(kBadRequest, failure + ", reason: " + error.what());
+  } catch (const abi::__forced_unwind&) {
+    throw;  // the thread is being cancelled
+  } catch (...) {
+    LogFailureText(kFailedRequest, failure);
+  }
+}
+
+Batch ReadBatch(const std::string& queue_path_tmp) {
+  std::string text;
+  CheckOrThrow(
+      ReadRegularFile(queue_path_tmp, std::numeric_limits<std::size_t>::max(), text),
+      {kIndexMgr, 340, "ProcessQueue"}, "!input_stream", Error::kGeneralError,
+      [] { return std::string("Failed to open appindex queue, reason=") + std::strerror(errno); });
+  Batch batch;
+  std::istringstream lines(text);
+  std::string line;
+  while (std::getline(lines, line)) ReadLine(batch, line);
+  return batch;
+}
+
+void Perform(int op, const std::string& path) {
+  switch (op) {
+    case kAdd:
+      return Add(path, true);
+    case kDel:
+      return Del(path, true);
+    case kReindex:
+      return Reindex();
+    default:
+      return;  // of a later version: replaced what was queued for the path before, and does nothing
+  }
+}
+
+}  // namespace
+
+void ProcessQueue() {
+  const LockFile process_lock(kProcessLockPath, true);
+  const std::string queue_path = kQueuePath;
+  const std::string queue_path_tmp = queue_path + ".tmp";
+  while (IsFileExist(queue_path) || IsFileExist(queue_path_tmp)) {
+    if (access(elastic::kElasticdSockPath, F_OK) != 0) return;  // no daemon: for a later call
+
+    // A batch that an earlier call left unfinished comes first.
+    if (!IsFileExist(queue_path_tmp)) TakeQueue(queue_path, queue_path_tmp);
+    if (!IsFileExist(queue_path_tmp)) return;
+    for (const auto& [path, op] : ReadBatch(queue_path_tmp)) Perform(op, path);
+
+    // Only now: until here the batch file is the record of what is not done yet.
+    unlink(queue_path_tmp.c_str());
+  }
+}
+
+}  // namespace velkor::appindex
