@@ -5,8 +5,6 @@
 // LanguagePack never changes and may be shared.
 #pragma once
 
-#include <json/forwards.h>
-
 #include <map>
 #include <memory>
 #include <optional>
@@ -37,9 +35,6 @@ class TEISEIGATRO_EXPORT LanguagePack {
   using Texts = std::unordered_map<std::string, std::optional<std::string>>;
   // By section; nothing where it cannot hold texts.
   using Sections = std::unordered_map<std::string, std::optional<Texts>>;
-
-  static Texts MakeTexts(const Json::Value& section);
-  static Sections MakeSections(const Json::Value& strings);
 
   std::map<std::string, Sections> langs_;  // by language code; only those that have texts
 };

@@ -21,6 +21,23 @@ constexpr char kTextsDir[] = "texts";
 constexpr char kFallbackLang[] = "enu";
 constexpr int kMaxSearchDepth = 5;
 
+template <typename Texts>
+void FillTexts(Texts& texts, const Json::Value& section) {
+  for (auto text = section.begin(); text != section.end(); ++text) {
+    auto& entry = texts[text.name()];
+    if (isJsonType<std::string>(*text)) entry = text->asString();
+  }
+}
+
+template <typename Sections>
+void FillSections(Sections& sections, const Json::Value& strings) {
+  for (auto section = strings.begin(); section != strings.end(); ++section) {
+    auto& entry = sections[section.name()];
+    // Null counts as a section without keys.
+    if (section->isObject() || section->isNull()) FillTexts(entry.emplace(), *section);
+  }
+}
+
 std::string PackageTextsRoot(const std::string& conf_path) {
   static const boost::regex reg("^(/var/packages/[^/]*)");
   boost::smatch sm;
@@ -54,30 +71,12 @@ bool FindPkgTextRoot(std::string& out, const std::string& find_dir, int depth) {
   return false;
 }
 
-LanguagePack::Texts LanguagePack::MakeTexts(const Json::Value& section) {
-  Texts texts;
-  for (auto text = section.begin(); text != section.end(); ++text) {
-    std::optional<std::string>& entry = texts[text.name()];
-    if (isJsonType<std::string>(*text)) entry = text->asString();
-  }
-  return texts;
-}
-
-LanguagePack::Sections LanguagePack::MakeSections(const Json::Value& strings) {
-  Sections sections;
-  if (!strings.isObject()) return sections;
-  for (auto section = strings.begin(); section != strings.end(); ++section) {
-    std::optional<Texts>& entry = sections[section.name()];
-    // Null counts as a section without keys.
-    if (section->isObject() || section->isNull()) entry = MakeTexts(*section);
-  }
-  return sections;
-}
-
 LanguagePack::LanguagePack(const std::string& texts_root) {
   for (const std::string& lang : GetSupportedLangs()) {
     const Json::Value strings = TOVO::PMX::LocalizedStringParser::ParseTexts(texts_root + lang);
-    if (strings.size() != 0) langs_.emplace(lang, MakeSections(strings));
+    if (strings.size() == 0) continue;
+    Sections& sections = langs_[lang];
+    if (strings.isObject()) FillSections(sections, strings);
   }
 }
 

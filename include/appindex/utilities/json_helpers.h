@@ -55,9 +55,8 @@ TEISEIGATRO_EXPORT std::vector<T> JsonArr2Vec(const Json::Value& value);
 // throws for a text; runs in the stack of a small thread (256 KiB).
 TEISEIGATRO_EXPORT bool fromString(Json::Value& value, const std::string& text);
 
-// The JSON text of `value`, on one line, in UTF-8. Where a text in it is not UTF-8, the whole
-// result is ASCII, with other characters escaped and the wrong bytes as U+FFFD: it is valid JSON in
-// any case.
+// The JSON text of `value`, on one line, in UTF-8. A byte that is not UTF-8 becomes U+FFFD, so the
+// result is valid JSON in any case.
 TEISEIGATRO_EXPORT std::string toString(const Json::Value& value);
 
 // Reads and parses a whole file as fromString does. Returns false, with `value` untouched, when the
