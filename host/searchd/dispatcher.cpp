@@ -1,0 +1,194 @@
+#include "host/searchd/dispatcher.h"
+
+#include <syslog.h>
+
+#include <map>
+#include <utility>
+
+#include "host/framing.h"
+#include "host/searchd/index_directory.h"
+#include "host/searchd/json_text.h"
+#include "host/searchd/permission.h"
+#include "host/searchd/request_error.h"
+
+namespace searchd {
+namespace {
+
+constexpr unsigned kDefaultLimit = 20;
+constexpr unsigned kMaxLimit = 1000;
+constexpr unsigned kMaxOffset = 1000000;
+
+std::string FailureText(Code code, const std::string& message) {
+  Json::Value reply(Json::objectValue);
+  reply["success"] = false;
+  reply["error"]["code"] = static_cast<int>(code);
+  reply["error"]["msg"] = message;
+  return JsonText(reply);
+}
+
+std::string RequiredString(const Json::Value& data, const char* member) {
+  if (!data[member].isString()) {
+    throw RequestError(Code::kRejected, std::string("\"") + member + "\" must be a string");
+  }
+  return data[member].asString();
+}
+
+unsigned OptionalNumber(const Json::Value& data, const char* member, unsigned absent,
+                        unsigned most) {
+  if (!data.isMember(member)) return absent;
+  const Json::Value& value = data[member];
+  if (!value.isUInt() || value.asUInt() > most) {
+    throw RequestError(Code::kRejected,
+                       std::string("\"") + member + "\" must be 0 to " + std::to_string(most));
+  }
+  return value.asUInt();
+}
+
+void CheckSettings(const Json::Value& settings) {
+  if (settings.isNull() || (settings.isObject() && settings.empty())) return;
+  throw RequestError(Code::kRejected, "\"settings\" must be an empty object");
+}
+
+Json::Value Nothing() { return Json::Value(Json::objectValue); }
+
+}  // namespace
+
+Answer Dispatcher::Handle(const std::string& request, uid_t client) {
+  Answer answer;
+  try {
+    Json::Value reply = Run(request, client, answer.after);
+    reply["success"] = true;
+    answer.text = JsonText(reply);
+    if (answer.text.size() > host::kMaxFrameBytes) {
+      throw RequestError(Code::kRejected, "the reply would be too long: ask for fewer hits");
+    }
+  } catch (const RequestError& e) {
+    if (e.GetCode() == Code::kStorage) syslog(LOG_ERR, "storage failure: %s", e.what());
+    answer.text = FailureText(e.GetCode(), e.what());
+  } catch (const std::exception& e) {
+    syslog(LOG_ERR, "request failed: %s", e.what());
+    answer.text = FailureText(Code::kStorage, e.what());
+  }
+  return answer;
+}
+
+std::string Dispatcher::TooLong() {
+  return FailureText(Code::kRejected, "the request is longer than " +
+                                          std::to_string(host::kMaxFrameBytes) + " bytes");
+}
+
+bool Dispatcher::HasIdleWork() { return catalog_.FindWithWork() != nullptr; }
+
+void Dispatcher::DoIdleWork() {
+  if (const auto index = catalog_.FindWithWork()) index->DoWork();
+}
+
+const Dispatcher::Command& Dispatcher::FindCommand(const std::string& name) {
+  static const std::map<std::string, Command> commands = {
+      {"index_create", {true, &Dispatcher::Create}},
+      {"index_delete", {true, &Dispatcher::Delete}},
+      {"document_upsert_by_id", {true, &Dispatcher::Upsert}},
+      {"document_del_by_id", {true, &Dispatcher::DeleteDocument}},
+      {"commit", {true, &Dispatcher::Commit}},
+      {"search", {false, &Dispatcher::Search}},
+      {"index_list", {false, &Dispatcher::List}},
+  };
+  const auto found = commands.find(name);
+  if (found == commands.end()) {
+    throw RequestError(Code::kUnknownCommand, "unknown command: " + name.substr(0, 100));
+  }
+  return found->second;
+}
+
+Json::Value Dispatcher::Run(const std::string& text, uid_t client, std::function<void()>& after) {
+  Json::Value request = ParseJson(text);
+  if (!request.isObject()) throw RequestError(Code::kRejected, "the request must be an object");
+  const std::string name = RequiredString(request, "command");
+  const Command& command = FindCommand(name);
+  if (command.changes && !MayChangeIndexes(client)) {
+    throw RequestError(Code::kNotPermitted,
+                       "user " + std::to_string(client) + " may not use " + name);
+  }
+  Json::Value& data = request["data"];
+  if (data.isNull()) data = Nothing();
+  if (!data.isObject()) throw RequestError(Code::kRejected, "\"data\" must be an object");
+
+  Request arguments{std::move(data), text.size(), nullptr};
+  Json::Value reply = (this->*command.run)(arguments);
+  after = std::move(arguments.after);
+  return reply;
+}
+
+void Dispatcher::ApplyAfterReply(Request& request, const std::shared_ptr<Index>& index) {
+  request.after = [index] { index->ApplyChanges(); };
+}
+
+Json::Value Dispatcher::Create(Request& request) {
+  const Json::Value& data = request.data;
+  const std::string id = RequiredString(data, "id");
+  const std::string path = CheckedIndexPath(RequiredString(data, "path"));
+  CheckSettings(data["settings"]);
+  catalog_.Create({id, path, data["mappings"]});
+  syslog(LOG_NOTICE, "index created: %s in %s", id.c_str(), path.c_str());
+  return Nothing();
+}
+
+Json::Value Dispatcher::Delete(Request& request) {
+  const std::string id = RequiredString(request.data, "id");
+  catalog_.Delete(id);
+  syslog(LOG_NOTICE, "index deleted: %s", id.c_str());
+  return Nothing();
+}
+
+Json::Value Dispatcher::Upsert(Request& request) {
+  const auto index = catalog_.Find(RequiredString(request.data, "id"));
+  const std::string document_id = RequiredString(request.data, "doc_id");
+  if (index->Upsert(document_id, std::move(request.data["data"]), request.bytes)) {
+    ApplyAfterReply(request, index);
+  }
+  return Nothing();
+}
+
+Json::Value Dispatcher::DeleteDocument(Request& request) {
+  const auto index = catalog_.Find(RequiredString(request.data, "id"));
+  if (index->Delete(RequiredString(request.data, "doc_id"))) ApplyAfterReply(request, index);
+  return Nothing();
+}
+
+Json::Value Dispatcher::Commit(Request& request) {
+  catalog_.Find(RequiredString(request.data, "id"))->Commit();
+  return Nothing();
+}
+
+Json::Value Dispatcher::Search(Request& request) {
+  const Json::Value& data = request.data;
+  const auto index = catalog_.Find(RequiredString(data, "id"));
+  const std::string query = RequiredString(data, "query");
+  const unsigned offset = OptionalNumber(data, "offset", 0, kMaxOffset);
+  const unsigned limit = OptionalNumber(data, "limit", kDefaultLimit, kMaxLimit);
+  SearchResult result = index->Search(query, offset, limit);
+  Json::Value reply = Nothing();
+  reply["total"] = result.total;
+  reply["hits"] = std::move(result.hits);
+  if (result.cut) reply["cut"] = true;
+  return reply;
+}
+
+Json::Value Dispatcher::List(Request&) {
+  Json::Value reply = Nothing();
+  Json::Value& indexes = reply["indexes"] = Json::Value(Json::arrayValue);
+  for (const auto& index : catalog_.All()) {
+    Json::Value entry = Nothing();
+    entry["id"] = index->Definition().id;
+    entry["path"] = index->Definition().path;
+    try {
+      entry["documents"] = index->DocumentCount();
+    } catch (const RequestError& e) {
+      entry["error"] = e.what();
+    }
+    indexes.append(std::move(entry));
+  }
+  return reply;
+}
+
+}  // namespace searchd

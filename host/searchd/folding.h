@@ -1,0 +1,20 @@
+// Bringing texts that mean the same into the same form, for documents and queries alike.
+#pragma once
+
+#include <unicode/unistr.h>
+
+#include <string>
+
+namespace searchd {
+
+// Compatibility forms and width variants as one, case folded; with `turkic`, I becomes dotless i
+// and dotted I becomes i. A zero-width space, which parts words in Thai and Khmer, becomes a space.
+icu::UnicodeString Fold(const icu::UnicodeString& text, bool turkic);
+
+// A folded text without accents ("zurich", "istanbul", "oeuvre") and with katakana as hiragana.
+// Marks that are letters of their own in a script, such as Thai vowels, stay.
+icu::UnicodeString WithoutAccents(const icu::UnicodeString& folded);
+
+std::string ToUtf8(const icu::UnicodeString& text);
+
+}  // namespace searchd

@@ -1,0 +1,195 @@
+#include "host/searchd/index_directory.h"
+
+#include <dirent.h>
+#include <fcntl.h>
+#include <sys/stat.h>
+#include <unistd.h>
+
+#include <algorithm>
+#include <array>
+#include <cerrno>
+#include <memory>
+#include <string_view>
+#include <vector>
+
+#include "host/sdk/unique_fd.h"
+#include "host/searchd/request_error.h"
+
+namespace searchd {
+namespace {
+
+using host::sdk::UniqueFd;
+
+constexpr std::string_view kPackages = "/var/packages/";
+constexpr std::size_t kMaxPathBytes = 1024;
+constexpr std::size_t kMaxComponentBytes = 255;
+
+constexpr const char* kMarker = "tovoelasticd.index";
+constexpr const char* kDatabaseVersion = "iamglass";
+constexpr std::array<const char*, 6> kTables = {"docdata.glass",  "postlist.glass",
+                                                "position.glass", "spelling.glass",
+                                                "synonym.glass",  "termlist.glass"};
+constexpr std::array<const char*, 3> kOtherFiles = {kDatabaseVersion, "flintlock", "v.tmp"};
+
+[[noreturn]] void Fail(const std::string& path) {
+  throw RequestError(Code::kStorage, WithErrno(path, errno));
+}
+
+void Sync(int dir, const std::string& path) {
+  if (fsync(dir) != 0) Fail(path);
+}
+
+std::vector<std::string> Components(std::string_view path) {
+  std::vector<std::string> components;
+  for (;;) {
+    const std::size_t slash = path.find('/');
+    components.emplace_back(path.substr(0, slash));
+    if (slash == std::string_view::npos) return components;
+    path.remove_prefix(slash + 1);
+  }
+}
+
+int OpenDirectoryAt(int parent, const std::string& name) {
+  return openat(parent, name.c_str(), O_RDONLY | O_DIRECTORY | O_NOFOLLOW | O_CLOEXEC);
+}
+
+// Opens "/var/packages" or a directory below it component by component, and makes missing ones if
+// asked. Returns -1 when one is missing.
+int OpenDirectory(std::string_view path, bool make) {
+  const std::string whole(path);
+  int dir = open(std::string(kPackages).c_str(), O_RDONLY | O_DIRECTORY | O_CLOEXEC);
+  if (dir < 0) Fail(std::string(kPackages));
+  if (path.size() <= kPackages.size()) return dir;
+  for (const std::string& name : Components(path.substr(kPackages.size()))) {
+    const UniqueFd parent(dir);
+    dir = OpenDirectoryAt(parent.Get(), name);
+    if (dir < 0 && errno == ENOENT) {
+      if (!make) return -1;
+      if (mkdirat(parent.Get(), name.c_str(), S_IRWXU) != 0) Fail(whole);
+      dir = OpenDirectoryAt(parent.Get(), name);
+    }
+    if (dir < 0 && (errno == ELOOP || errno == ENOTDIR)) {
+      throw RequestError(Code::kNotPermitted,
+                         whole + ": \"" + name + "\" is a link or not a directory");
+    }
+    if (dir < 0) Fail(whole);
+  }
+  return dir;
+}
+
+std::vector<std::string> Entries(int dir, const std::string& path) {
+  // A stream of its own, because closing it closes the descriptor.
+  const int copy = openat(dir, ".", O_RDONLY | O_DIRECTORY | O_CLOEXEC);
+  if (copy < 0) Fail(path);
+  const std::unique_ptr<DIR, int (*)(DIR*)> stream(fdopendir(copy), closedir);
+  if (!stream) Fail(path);
+  std::vector<std::string> names;
+  while (const dirent* entry = readdir(stream.get())) {
+    const std::string name = entry->d_name;
+    if (name != "." && name != "..") names.push_back(name);
+  }
+  return names;
+}
+
+template <typename Names>
+bool Contains(const Names& names, const std::string& name) {
+  return std::find(names.begin(), names.end(), name) != names.end();
+}
+
+bool IsIndexFile(const std::string& name) {
+  return name == kMarker || Contains(kTables, name) || Contains(kOtherFiles, name);
+}
+
+// The marker goes last: as long as a file of the index is there, the directory is known as ours.
+void RemoveIndexFiles(int dir, const std::string& path) {
+  const auto remove = [&](const char* name) {
+    if (unlinkat(dir, name, 0) != 0 && errno != ENOENT) Fail(path + "/" + name);
+  };
+  for (const char* name : kTables) remove(name);
+  for (const char* name : kOtherFiles) remove(name);
+  remove(kMarker);
+}
+
+void ClearLeftovers(int dir, const std::string& path) {
+  const std::vector<std::string> names = Entries(dir, path);
+  if (names.empty()) return;
+  const bool marked = Contains(names, kMarker);
+  for (const std::string& name : names) {
+    if (marked && IsIndexFile(name)) continue;
+    throw RequestError(Code::kRejected,
+                       "\"path\" holds what is not of an index: " + path + "/" + name);
+  }
+  RemoveIndexFiles(dir, path);
+}
+
+bool IsFile(int dir, const char* name, off_t at_least) {
+  struct stat status {};
+  return fstatat(dir, name, &status, AT_SYMLINK_NOFOLLOW) == 0 && S_ISREG(status.st_mode) &&
+         status.st_size >= at_least;
+}
+
+}  // namespace
+
+std::string CheckedIndexPath(const std::string& path) {
+  if (path.size() > kMaxPathBytes) {
+    throw RequestError(Code::kRejected,
+                       "\"path\" is longer than " + std::to_string(kMaxPathBytes) + " bytes");
+  }
+  if (path.compare(0, kPackages.size(), kPackages) != 0) {
+    throw RequestError(Code::kNotPermitted,
+                       "\"path\" must lie below " + std::string(kPackages) + ": " + path);
+  }
+  std::string_view below = std::string_view(path).substr(kPackages.size());
+  if (!below.empty() && below.back() == '/') below.remove_suffix(1);
+  for (const std::string& name : Components(below)) {
+    if (name.empty() || name == "." || name == ".." || name.size() > kMaxComponentBytes) {
+      throw RequestError(Code::kRejected,
+                         "\"path\" must not have empty, \".\", \"..\" or over-long parts: " + path);
+    }
+  }
+  return std::string(kPackages).append(below);
+}
+
+void PrepareIndexDirectory(const std::string& path) {
+  const UniqueFd dir(OpenDirectory(path, true));
+  ClearLeftovers(dir.Get(), path);
+  const UniqueFd marker(
+      openat(dir.Get(), kMarker, O_WRONLY | O_CREAT | O_EXCL | O_CLOEXEC, S_IRUSR | S_IWUSR));
+  if (!marker.IsOpen()) Fail(path + "/" + kMarker);
+}
+
+void RemoveIndexDirectory(const std::string& path) {
+  {
+    const UniqueFd dir(OpenDirectory(path, false));
+    if (!dir.IsOpen()) return;
+    RemoveIndexFiles(dir.Get(), path);
+  }
+  // One that holds something else stays: whoever put it there may want it.
+  if (rmdir(path.c_str()) != 0 && errno != ENOTEMPTY && errno != EEXIST) Fail(path);
+}
+
+bool HoldsDatabase(const std::string& path) {
+  const UniqueFd dir(OpenDirectory(path, false));
+  if (!dir.IsOpen() || !IsFile(dir.Get(), kMarker, 0)) {
+    throw RequestError(Code::kStorage, path + "/" + kMarker + " is missing: the index is damaged");
+  }
+  if (IsFile(dir.Get(), kDatabaseVersion, 0)) return true;
+  for (const char* table : kTables) {
+    if (!IsFile(dir.Get(), table, 1)) continue;
+    throw RequestError(Code::kStorage,
+                       path + "/" + kDatabaseVersion + " is missing: the index is damaged");
+  }
+  return false;
+}
+
+void SyncIndexDirectory(const std::string& path, bool parents) {
+  std::string_view at = path;
+  do {
+    const UniqueFd dir(OpenDirectory(at, false));
+    if (!dir.IsOpen()) Fail(path);
+    Sync(dir.Get(), path);
+    at = at.substr(0, at.rfind('/'));
+  } while (parents && at.size() + 1 >= kPackages.size());
+}
+
+}  // namespace searchd

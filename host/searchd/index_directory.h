@@ -1,0 +1,30 @@
+// The directory of an index: where it may lie, what it may hold, and what is durable in it.
+//
+// It holds a marker file, which says that the files are the daemon's, and a Xapian database as soon
+// as there is one. None of the calls follows a symbolic link below "/var/packages/".
+#pragma once
+
+#include <string>
+
+namespace searchd {
+
+// The path as it is kept: absolute, below "/var/packages/", without a trailing "/". Throws
+// RequestError: kRejected for a path that is not plain (empty, ".", ".." or over-long components),
+// kNotPermitted for one elsewhere.
+std::string CheckedIndexPath(const std::string& path);
+
+// Makes the empty directory of a new index with missing parents, mode 0700. What an earlier index
+// left there is cleared; anything else that is found there is rejected.
+void PrepareIndexDirectory(const std::string& path);
+
+// Removes an index's files and its directory. A directory that is gone already is no error.
+void RemoveIndexDirectory(const std::string& path);
+
+// Whether there is a database to open; false for an index into which nothing was ever committed.
+// Throws RequestError(kStorage) when the directory is not that of an index.
+bool HoldsDatabase(const std::string& path);
+
+// Makes the directory's entries durable, and with `parents` the directory itself.
+void SyncIndexDirectory(const std::string& path, bool parents);
+
+}  // namespace searchd

@@ -1,0 +1,57 @@
+// Searching one index, in its last committed state.
+#pragma once
+
+#include <json/value.h>
+#include <xapian.h>
+
+#include <atomic>
+#include <functional>
+#include <memory>
+#include <mutex>
+#include <string>
+
+#include "host/searchd/analyzer.h"
+#include "host/searchd/database_check.h"
+#include "host/searchd/mapping.h"
+
+namespace searchd {
+
+struct SearchResult {
+  Xapian::doccount total = 0;
+  Json::Value hits = Json::Value(Json::arrayValue);
+  bool cut = false;  // the query was longer than is looked at
+};
+
+// Any thread may call. Both queries throw RequestError when the index cannot be read.
+class IndexReader {
+ public:
+  IndexReader(std::string path, const Mapping& mapping, const Language& language,
+              DatabaseCheck& check);
+
+  SearchResult Search(const std::string& query, unsigned offset, unsigned limit);
+  Xapian::doccount DocumentCount();
+
+  // Makes the next call look at the files again.
+  void Refresh() { stale_ = true; }
+
+  // Lets go of the files; later calls find nothing.
+  void Close();
+
+ private:
+  // Runs `read` on the open database; does nothing when nothing was ever committed or after Close.
+  void Read(const std::function<void(Xapian::Database&)>& read);
+  void OpenDatabase();
+
+  const std::string path_;
+  const Mapping& mapping_;
+  const Language language_;
+  DatabaseCheck& check_;
+
+  std::mutex mutex_;
+  std::unique_ptr<Analyzer> analyzer_;
+  std::unique_ptr<Xapian::Database> database_;
+  bool closed_ = false;
+  std::atomic<bool> stale_ = false;
+};
+
+}  // namespace searchd

@@ -1,0 +1,62 @@
+// The daemon as a process: background, lock, socket, signals.
+#pragma once
+
+#include <sys/types.h>
+
+#include <stdexcept>
+#include <string>
+
+#include "host/sdk/unique_fd.h"
+
+namespace searchd {
+
+class AlreadyRunning : public std::runtime_error {
+  using std::runtime_error::runtime_error;
+};
+
+// Goes on in a new session in a child process. The calling process ends here: with 0 when the child
+// has written to the returned descriptor, or with the child's exit status when it ends before.
+int GoToBackground();
+
+// Lets go of the terminal: standard input, output and error become `null_fd`.
+void DropTerminal(int null_fd);
+
+// Writes "ready" to the descriptor and closes it.
+void ReportReady(int fd);
+
+// Holds a lock file as long as it lives; the system lets go of it however the process ends. The
+// file stays and holds the process id. Throws AlreadyRunning or std::runtime_error.
+class ProcessLock {
+ public:
+  explicit ProcessLock(const std::string& file);
+
+ private:
+  host::sdk::UniqueFd fd_;
+};
+
+// Returns a listening socket at `path` that every user may connect to. A socket that nobody listens
+// on is replaced; anything else that is there is left alone, and std::runtime_error thrown.
+int Listen(const std::string& path);
+
+// Removes the socket file when it goes out of scope, unless another has taken its place.
+class SocketFile {
+ public:
+  explicit SocketFile(std::string path);
+  ~SocketFile();
+  SocketFile(const SocketFile&) = delete;
+  SocketFile& operator=(const SocketFile&) = delete;
+
+ private:
+  const std::string path_;
+  dev_t device_ = 0;
+  ino_t inode_ = 0;
+};
+
+// Blocks SIGTERM and SIGINT in the calling thread and those it starts, and returns a descriptor
+// that becomes readable when one arrives. SIGPIPE is ignored from then on.
+int CatchStopSignals();
+
+// As many descriptors as the system allows: each open index holds several.
+void RaiseDescriptorLimit();
+
+}  // namespace searchd

@@ -1,0 +1,209 @@
+#include "host/searchd/server.h"
+
+#include <poll.h>
+#include <sys/epoll.h>
+#include <sys/eventfd.h>
+#include <sys/socket.h>
+#include <syslog.h>
+#include <unistd.h>
+
+#include <algorithm>
+#include <cerrno>
+#include <cstdint>
+#include <stdexcept>
+#include <thread>
+#include <utility>
+
+#include "host/searchd/request_error.h"
+
+namespace searchd {
+namespace {
+
+using std::chrono::milliseconds;
+
+// No request for this long is a pause in which other work is not in the way.
+constexpr int kIdleMilliseconds = 2;
+constexpr milliseconds kAcceptPause(100);
+// How long the end of the daemon waits for a client to take its reply.
+constexpr int kLastSendMilliseconds = 1000;
+
+}  // namespace
+
+Server::Server(Handler& handler, int listener, int stop_signals, milliseconds time_limit)
+    : handler_(handler),
+      listener_(listener),
+      stop_signals_(stop_signals),
+      events_(epoll_create1(EPOLL_CLOEXEC)),
+      wake_(eventfd(0, EFD_CLOEXEC | EFD_NONBLOCK)),
+      time_limit_(time_limit) {
+  if (!events_.IsOpen() || !wake_.IsOpen()) {
+    throw std::runtime_error(WithErrno("cannot wait for clients", errno));
+  }
+  Watch(wake_.Get(), EPOLLIN);
+  Watch(stop_signals_.Get(), EPOLLIN);
+}
+
+void Server::Run(unsigned threads) {
+  std::vector<std::thread> others;
+  for (unsigned i = 1; i < threads; ++i) others.emplace_back([this] { Work(); });
+  Work();
+  for (std::thread& other : others) other.join();
+  FinishSending();
+}
+
+void Server::Work() {
+  for (;;) {
+    Job job;
+    {
+      const std::lock_guard lock(turn_);
+      if (!stopped_) job = WaitForJob();
+      if (stopped_) return;
+    }
+    if (job.connection) Serve(std::move(job.connection));
+    if (job.idle_work) handler_.DoIdleWork();
+  }
+}
+
+void Server::Serve(std::unique_ptr<Connection> connection) {
+  const Answer answer = handler_.Handle(connection->TakeRequest(), connection->Client());
+  connection->Reply(answer.text, Clock::now() + time_limit_);
+  if (connection->GetState() == State::kSending) {
+    {
+      const std::lock_guard lock(returned_mutex_);
+      returned_.push_back(std::move(connection));
+    }
+    eventfd_write(wake_.Get(), 1);
+  }
+  connection.reset();
+  if (answer.after) answer.after();
+}
+
+void Server::FinishSending() {
+  TakeBack();
+  for (auto& [fd, connection] : connections_) {
+    pollfd writable{fd, POLLOUT, 0};
+    while (connection->GetState() == State::kSending &&
+           poll(&writable, 1, kLastSendMilliseconds) > 0) {
+      connection->Continue();
+    }
+  }
+  connections_.clear();
+}
+
+Server::Job Server::WaitForJob() {
+  for (;;) {
+    DropExpired();
+    UpdateListening();
+    const bool idle_work = handler_.HasIdleWork();
+    epoll_event event{};
+    const int found = epoll_wait(events_.Get(), &event, 1, WaitMilliseconds(idle_work));
+    if (found == 0 && idle_work) return {nullptr, true};
+    if (found <= 0) continue;
+    if (auto connection = HandleEvent(event.data.fd)) return {std::move(connection), false};
+    if (stopped_) return {};
+  }
+}
+
+int Server::WaitMilliseconds(bool idle_work) const {
+  if (idle_work) return kIdleMilliseconds;
+  TimePoint next = TimePoint::max();
+  for (const auto& [fd, connection] : connections_) next = std::min(next, connection->Deadline());
+  if (!listening_) next = std::min(next, std::max(accept_again_, Clock::now() + kAcceptPause));
+  if (next == TimePoint::max()) return -1;
+  const auto left = std::chrono::ceil<milliseconds>(next - Clock::now()).count();
+  return static_cast<int>(std::clamp<std::int64_t>(left, 0, 60 * 1000));
+}
+
+// Returns a connection whose request is complete.
+std::unique_ptr<Connection> Server::HandleEvent(int fd) {
+  if (fd == listener_.Get()) return Accept();
+  if (fd == stop_signals_.Get()) {
+    stopped_ = true;
+    return nullptr;
+  }
+  if (fd == wake_.Get()) {
+    TakeBack();
+    return nullptr;
+  }
+  const auto found = connections_.find(fd);
+  if (found == connections_.end()) return nullptr;
+  std::unique_ptr<Connection> connection = std::move(found->second);
+  connections_.erase(found);
+  Unwatch(fd);
+  connection->Continue();
+  return Continue(std::move(connection));
+}
+
+std::unique_ptr<Connection> Server::Accept() {
+  const int fd = accept4(listener_.Get(), nullptr, nullptr, SOCK_CLOEXEC | SOCK_NONBLOCK);
+  if (fd < 0) {
+    if (errno == EMFILE || errno == ENFILE || errno == ENOBUFS || errno == ENOMEM) {
+      syslog(LOG_WARNING, "%s", WithErrno("cannot accept a client", errno).c_str());
+      accept_again_ = Clock::now() + kAcceptPause;
+    }
+    return nullptr;
+  }
+  auto connection = std::make_unique<Connection>(fd, Clock::now() + time_limit_);
+  connection->Continue();
+  return Continue(std::move(connection));
+}
+
+// Sees to it that a connection goes on from the state that it is in.
+std::unique_ptr<Connection> Server::Continue(std::unique_ptr<Connection> connection) {
+  if (connection->GetState() == State::kTooLong) {
+    connection->Reply(handler_.TooLong(), Clock::now() + time_limit_);
+  }
+  if (connection->GetState() == State::kReceived) return connection;
+  if (connection->GetState() == State::kDone) return nullptr;
+  const int fd = connection->Fd();
+  Watch(fd, connection->GetState() == State::kSending ? EPOLLOUT : EPOLLIN);
+  connections_[fd] = std::move(connection);
+  return nullptr;
+}
+
+void Server::TakeBack() {
+  eventfd_t count = 0;
+  eventfd_read(wake_.Get(), &count);
+  std::vector<std::unique_ptr<Connection>> returned;
+  {
+    const std::lock_guard lock(returned_mutex_);
+    returned.swap(returned_);
+  }
+  for (auto& connection : returned) Continue(std::move(connection));
+}
+
+void Server::DropExpired() {
+  const TimePoint now = Clock::now();
+  for (auto it = connections_.begin(); it != connections_.end();) {
+    if (it->second->Deadline() > now) {
+      ++it;
+      continue;
+    }
+    Unwatch(it->first);
+    it = connections_.erase(it);
+  }
+}
+
+void Server::UpdateListening() {
+  const bool listen = connections_.size() < kMaxConnections && Clock::now() >= accept_again_;
+  if (listen == listening_) return;
+  listening_ = listen;
+  if (listen) {
+    Watch(listener_.Get(), EPOLLIN);
+  } else {
+    Unwatch(listener_.Get());
+  }
+}
+
+void Server::Watch(int fd, unsigned events) {
+  epoll_event event{};
+  event.events = events;
+  event.data.fd = fd;
+  if (epoll_ctl(events_.Get(), EPOLL_CTL_ADD, fd, &event) != 0) {
+    syslog(LOG_ERR, "%s", WithErrno("cannot wait for a client", errno).c_str());
+  }
+}
+
+void Server::Unwatch(int fd) { epoll_ctl(events_.Get(), EPOLL_CTL_DEL, fd, nullptr); }
+
+}  // namespace searchd
