@@ -16,11 +16,13 @@ int TLIBCFileGetKeyValue(const char* file, const char* key, char* value, int siz
 
 // Writes a terminated text that identifies the installed system release, as component `component`
 // would name it in a user agent, into `text`, a buffer of `size` bytes. Two different releases give
-// two different texts. Returns 0 or more on success and a negative number on failure.
+// two different texts, so a text that does not fit is a failure rather than cut. Returns 0 or more
+// on success and a negative number on failure.
 int TLIBHbinfoUserAgentGet(const char* component, char* text, int size);
 
 // Returns the number of the last error met by one of the device's functions in this thread; 0 when
-// there was none.
+// there was none. A success leaves it as it was. What the numbers mean is the port's own; none is
+// negative.
 int TLIBCErrGet(void);
 
 #ifdef __cplusplus

@@ -15,10 +15,11 @@ typedef struct TOVOCOPYARGS {
   uint32_t words[15];  // [0]: always 1. [1]: 1 = move, the source is removed at the end
 } TOVOCOPYARGS;
 
-// Copies or moves the file `src` to the path `dst`, replacing a file that is there. Mode, owner and
-// times are kept as far as the process may. A move removes the source last, so that a failure never
-// loses the content. Blocks until done. Returns 0 when done, a negative number on failure with
-// errno telling why and nothing left at a temporary name.
+// Copies or moves the regular file `src` to the path `dst`, replacing a file that is there. Mode,
+// owner and times are kept as far as the process may. A move removes the source last, so that a
+// failure never loses the content. Blocks until done. Returns 0 when done, a negative number on
+// failure with errno telling why, nothing left at a temporary name and what stood at `dst` either
+// as it was or wholly replaced.
 int TOVOFileCopy(const char* src, const char* dst, TOVOCOPYARGS* args);
 
 // Sets `*perm` to the permission bits that the effective user has on `path`: read 4, write 2,

@@ -40,5 +40,5 @@ int TLIBGroupIsAdminGroupMem(const char* name, int flags);
 // Switches the effective user and group of the whole process to those of user `name`; with
 // `reset_groups` the supplementary groups too. Works from root to a user and from that user back to
 // root. Returns false, with the identity as it was, when there is no such user or the process may
-// not switch.
+// not switch. To be that user already is a success.
 bool ResetCredentialsByName(std::string name, bool reset_groups);

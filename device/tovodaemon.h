@@ -29,7 +29,8 @@ class SockConnection {
 
   // Receives one whole message into `message`, replacing its content. Blocks until it is complete.
   // Returns false, with `message` empty, when not connected, when the peer closes before a message
-  // is complete or when the message is longer than the port allows.
+  // is complete or when the message is longer than the port allows; errno then tells why, and is 0
+  // when the peer closed in good order.
   bool Recv(std::string& message);
 
  protected:

@@ -152,7 +152,7 @@ TEST_F(UserTest, WithoutTheGroupNobodyIsAnAdministrator) {
   RunInRoot(root_, [] { EXPECT_EQ(TLIBGroupIsAdminGroupMem("alice", 0), 0); });
 }
 
-// Nothing here has settings or the group, and the database lacks what one looks for on the way.
+// The device has neither settings nor a group of administrators.
 TEST_F(UserTest, ASuccessLeavesNoErrorToBeLoggedLater) {
   root_.Write("etc/group", "users:x:61200:alice\n");
   RunInRoot(root_, [] {
