@@ -11,13 +11,15 @@ namespace velkor::appindex {
 // "indexed_version". An object of this class is used by one thread at a time.
 class TEISEIGATRO_EXPORT Config {
  public:
-  // Loads the record. `indexed_version` stays empty when there is no file or the file has no such
-  // string. Throws Error 504 with "Cannot load json: " and the path when the file is not valid JSON
-  // (logged too), and Error 120 when its JSON is not an object.
+  // Loads the record, with the effective user's rights. `indexed_version` stays empty when there is
+  // no file or the file has no such string. Throws Error 504 with "Cannot load json: " and the path
+  // when the file cannot be read (only root may, once it was saved) or is not valid JSON (logged
+  // too), and Error 120 when its JSON is not an object.
   Config();
 
   // The version of the system that is running, as the device names it. Asked once and kept, unless
-  // it came back empty. Throws Error 502 with "TLIBHbinfoUserAgentGet failed", logged too.
+  // it came back empty. The reference is valid as long as the object. Throws Error 502 with
+  // "TLIBHbinfoUserAgentGet failed", logged too.
   const std::string& GetCurrentVersion();
 
   // Writes the record, mode 0600, replacing the file as a whole: after a crash there is the old

@@ -22,8 +22,9 @@ TEISEIGATRO_EXPORT const std::set<std::string>& GetSupportedLangs();
 //
 // Throws Error 502 with "Failed to get unique" when the string cannot be read, and with
 // "Malformed hb unique: " and the string when it has another shape; either is logged too, nothing
-// is kept, and the next call tries again. Takes no lock: callers with several threads make the
-// first call from one of them.
+// is kept, and the next call tries again. A platform or model that is itself empty is read again by
+// every call. Takes no lock: callers with several threads make the first call from one of them, and
+// on a device with an empty name every call.
 TEISEIGATRO_EXPORT const std::string& GetPlatform();
 TEISEIGATRO_EXPORT const std::string& GetModel();
 

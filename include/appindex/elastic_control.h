@@ -3,14 +3,17 @@
 // Each call but GetAppIndexID is one request over "/var/run/tovoelasticd.sock", on a connection of
 // its own. It returns when the daemon has answered with success.
 //
-// It blocks: up to 15 s while the socket file is missing; without limit while the daemon answers
-// that its database is not ready (codes 607, 608, 610: asked again every 30 s) or that it is busy
-// (1400: asked again after 15 to 19 minutes), each time with a line in the system log.
+// It blocks: up to 15 s while the socket file is missing; up to ten days while the daemon's queue
+// of connections is full, and until the reply comes; without limit while the daemon answers that
+// its database is not ready (codes 607, 608, 610: asked again every 30 s) or that it is busy (1400:
+// asked again after 15 to 19 minutes), each time with a line in the system log.
 //
-// It throws Error 913 when connecting, sending or receiving fails or the reply is malformed, any
-// other code of the daemon as it is ("Request failed, msg=" and the daemon's text), and Error 120
-// when the daemon reports a failure without a code and a text. Calls from several threads are
-// independent.
+// It throws Error 913 when the exchange fails ("Connect failed, req=", "Send failed, req=" or "Recv
+// failed, req=", the last for a malformed reply too), any other code of the daemon as it is
+// ("Request failed, msg=" and the daemon's text), and Error 120 when the daemon reports a failure
+// without a code or without a text. Each 913 and each code of the daemon is logged too, with the
+// whole request; the reasons of 913 hold it as well, documents and all. Acts with the caller's
+// effective user. Calls from several threads are independent.
 #pragma once
 
 #include <json/value.h>

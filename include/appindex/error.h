@@ -10,8 +10,8 @@
 namespace velkor {
 
 // Every failure that the library reports is thrown as an Error: a number that tells what failed and
-// a text that tells why. Numbers below 600 and 801, 913 and 1300 are the library's own; the search
-// daemon's numbers arrive in the same field, taken as they are.
+// a text that tells why. The search daemon's numbers arrive
+// in the same field as the library's own, taken as they are.
 class TEISEIGATRO_EXPORT Error : public std::runtime_error {
  public:
   // Any value of 32 bits may be stored, also one without a name here.

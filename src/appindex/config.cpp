@@ -6,6 +6,7 @@
 #include "appindex/utilities/file_utils.h"
 #include "appindex/utilities/json_helpers.h"
 #include "common/check.h"
+#include "common/json_strict.h"
 #include "device/tovo_config.h"
 
 namespace velkor::appindex {
@@ -27,9 +28,7 @@ Config::Config() {
                "IsFileExist(kAppIndexCfgPath) && !data.fromFile(kAppIndexCfgPath)",
                Error::kConfigLoadError,
                [] { return std::string("Cannot load json: ") + kAppIndexCfgPath; });
-  Json::Value version;
-  GetJsonValue(version, data, kIndexedVersion, false);
-  if (version.isString()) indexed_version = version.asString();  // a number is no version
+  GetStrictString(indexed_version, data, kIndexedVersion, false);
 }
 
 const std::string& Config::GetCurrentVersion() {

@@ -9,6 +9,7 @@
 #include "appindex/elastic_control_internal.h"
 #include "appindex/utilities/json_helpers.h"
 #include "common/check.h"
+#include "common/json_strict.h"
 #include "device/tovodaemon.h"
 
 namespace velkor::appindex::elastic {
@@ -27,7 +28,6 @@ constexpr int kBusyMinuteSteps = 5;
 constexpr unsigned kSecondsPerMinute = 60;
 
 constexpr char kIndexIdPrefix[] = "appindex_";
-constexpr char kIndexStorageDir[] = "/var/packages/Velkor/etc/appindex.db/";
 
 // "white space" is spelled with the blank: so the daemon names that analyzer.
 constexpr char kAppIndexMappings[] = R"({
@@ -147,7 +147,7 @@ std::string GetAppIndexID(const std::string& lang) { return kIndexIdPrefix + lan
 
 void AppIndexCreate(const std::string& lang) {
   Json::Value request = MakeRequest("index_create", lang);
-  request["data"]["path"] = kIndexStorageDir + lang;
+  request["data"]["path"] = kIndexDbDir + lang;
   request["data"]["settings"] = Json::Value(Json::objectValue);
   request["data"]["mappings"] = GetAppIndexMappings();
   SendRequest(request);
@@ -156,11 +156,8 @@ void AppIndexCreate(const std::string& lang) {
 void AppIndexDelete(const std::string& lang) { SendRequest(MakeRequest("index_delete", lang)); }
 
 void IndexUpsert(const std::string& lang, const Json::Value& doc) {
-  Json::Value doc_id;
-  GetJsonValue(doc_id, doc, "id", true);
-  // A number is a text by the JSON library's rule, but never a document's key.
-  if (!doc_id.isString()) throw Error(Error::kJsonError, "Not a string" + AppendData(doc));
-
+  std::string doc_id;
+  GetStrictString(doc_id, doc, "id", true);
   Json::Value request = MakeRequest("document_upsert_by_id", lang);
   request["data"]["doc_id"] = doc_id;
   request["data"]["data"] = doc;

@@ -10,6 +10,9 @@ namespace velkor::appindex::elastic {
 
 constexpr char kElasticdSockPath[] = "/var/run/tovoelasticd.sock";
 
+// Where the daemon keeps the app indexes, one directory per language.
+constexpr char kIndexDbDir[] = "/var/packages/Velkor/etc/appindex.db/";
+
 // Sends one request on a connection of its own and puts the daemon's reply into `response` when it
 // reports success; otherwise throws Error 913 (transport), the daemon's own code, or 120 (a failure
 // reply without code or text). `response` is untouched when no reply could be parsed.

@@ -15,7 +15,7 @@ constexpr unsigned kMaxSearchDepth = 5;
 constexpr char kModuleIdSeparator[] = "?";
 
 const std::set<std::string> kAppRoots = {"/var/packages/", "/usr/tovo/tovoman/webman/modules/"};
-const std::set<std::string> kNoApplications = {".", "..", "Docuvault"};
+constexpr char kNoApplication[] = "Docuvault";
 
 void LogMalformed(const std::string& conf_path) {
   LogFailureText({kIndexMgr, 36, "FindIndexables"}, "Malformed index.conf: " + conf_path);
@@ -109,7 +109,7 @@ std::set<std::string> FindIndexConf() {
                  [&root] { return "opendir failed, path=" + root; });
     std::string name;
     while (dir.Next(name)) {
-      if (kNoApplications.count(name) != 0) continue;
+      if (name == kNoApplication) continue;
       const std::string app_dir = root + name + "/";
       std::string conf_path;
       if (IsDirExist(app_dir, false) && FindIndexConfByAppRoot(conf_path, app_dir, 0)) {

@@ -4,12 +4,13 @@
 #include "appindex/error.h"
 #include "appindex/index_mgr_internal.h"
 #include "appindex/utilities/json_helpers.h"
+#include "appindex/utils_internal.h"
 #include "common/check.h"
+#include "common/json_strict.h"
 
 namespace velkor::appindex {
 namespace {
 
-constexpr char kSecondLang[] = "enu";
 constexpr int kMaxWeight = 5;
 
 struct Keyword {
@@ -24,9 +25,7 @@ Keyword ReadKeyword(const Json::Value& element) {
     return keyword;
   }
   GetJsonValue(keyword.ref, element, "text", true);
-  Json::Value weight;
-  GetJsonValue(weight, element, "weight", false);
-  if (weight.isInt()) keyword.weight = weight.asInt();
+  GetStrictInt(keyword.weight, element, "weight", false);
   return keyword;
 }
 
@@ -34,14 +33,13 @@ Keyword ReadKeyword(const Json::Value& element) {
 void AppendKeyword(std::string& text, StringPool& pool, const std::string& lang,
                    const Keyword& keyword) {
   const std::string pair =
-      pool.GetString(lang, keyword.ref) + " " + pool.GetString(kSecondLang, keyword.ref) + " ";
+      pool.GetString(lang, keyword.ref) + " " + pool.GetString(kEnglish, keyword.ref) + " ";
   for (int i = 0; i < std::min(keyword.weight, kMaxWeight); ++i) text += pair;
 }
 
 std::string MakeKeywordText(StringPool& pool, const std::string& lang,
                             const Json::Value& keywords) {
   std::string text;
-  if (!keywords.isArray() && !keywords.isObject()) return text;
   for (const Json::Value& element : keywords) {
     try {
       AppendKeyword(text, pool, lang, ReadKeyword(element));
@@ -74,7 +72,7 @@ Json::Value MakeDocument(StringPool& pool, const std::string& lang, const Json::
   doc["owner"] = record["owner"];
   doc["title"] = pool.GetString(lang, title_ref);
   doc["desc"] = pool.GetString(lang, record["desc"].asString());
-  doc["keywords"] = pool.GetString(kSecondLang, title_ref) + " " + keyword_text;
+  doc["keywords"] = pool.GetString(kEnglish, title_ref) + " " + keyword_text;
   doc["search_title"] = doc["title"];
   return doc;
 }

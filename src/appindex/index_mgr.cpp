@@ -8,6 +8,7 @@
 #include "appindex/config.h"
 #include "appindex/device_identity.h"
 #include "appindex/elastic_control.h"
+#include "appindex/elastic_control_internal.h"
 #include "appindex/error.h"
 #include "appindex/index_mgr_internal.h"
 #include "appindex/utilities/file_utils.h"
@@ -16,13 +17,26 @@
 namespace velkor::appindex {
 namespace {
 
-constexpr char kIndexDbDir[] = "/var/packages/Velkor/etc/appindex.db/";
 constexpr mode_t kIndexDbMode = 0700;
 
 // Leaves the daemon time for searches between two writes, also between a last and a next first one.
 constexpr useconds_t kUpsertPauseMicroseconds = 10000;
 
+// A rebuild creates every index before it fills them, so a missing index inside one is rare and one
+// inside that rarer. A daemon that never keeps an index must not lead to a rebuild without end.
+constexpr int kMaxNestedRebuilds = 8;
+int nested_rebuilds = 0;
+
 StringPool string_pool;
+
+void RecoverByRebuild() {
+  struct Nesting {
+    Nesting() { ++nested_rebuilds; }
+    ~Nesting() { --nested_rebuilds; }
+  };
+  const Nesting nesting;
+  Reindex();
+}
 
 void AddInEveryLanguage(const std::string& conf_path, bool commit) {
   for (const std::string& lang : GetSupportedLangs()) {
@@ -53,10 +67,10 @@ void Add(const std::string& conf_path, bool commit) {
     AddInEveryLanguage(conf_path, commit);
     return;
   } catch (const Error& error) {
-    if (error.code != Error::kDaemonIndexMissing) throw;
+    if (error.code != Error::kDaemonIndexMissing || nested_rebuilds >= kMaxNestedRebuilds) throw;
   }
   LogFailureText({kIndexMgr, 245, "Add"}, "Do reindex to recover missing indices");
-  Reindex();
+  RecoverByRebuild();
 }
 
 void Del(const std::string& conf_path, bool commit) {
@@ -71,12 +85,12 @@ void Del(const std::string& conf_path, bool commit) {
 }
 
 void Reindex() {
-  // Everything that may be missing or unreadable is looked at before anything is deleted.
+  // Before anything is deleted: a directory that cannot be read leaves the index as it is.
   const std::set<std::string> conf_paths = FindIndexConf();
   Config config;
   LogNotice(kIndexMgr, 290, "Reindex app");
 
-  mkdir(kIndexDbDir, kIndexDbMode);  // there already, as a rule
+  mkdir(elastic::kIndexDbDir, kIndexDbMode);  // there already, as a rule
   for (const std::string& lang : GetSupportedLangs()) RecreateIndex(lang);
   for (const std::string& conf_path : conf_paths) Add(conf_path, false);
   for (const std::string& lang : GetSupportedLangs()) elastic::IndexCommit(lang);

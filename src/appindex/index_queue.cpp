@@ -2,12 +2,12 @@
 #include <cxxabi.h>
 #include <unistd.h>
 
+#include <algorithm>
 #include <cerrno>
 #include <cstdio>
 #include <cstring>
 #include <limits>
 #include <map>
-#include <sstream>
 
 #include "appindex/elastic_control_internal.h"
 #include "appindex/error.h"
@@ -18,6 +18,7 @@
 #include "appindex/utilities/lock_file.h"
 #include "common/check.h"
 #include "common/file_io.h"
+#include "common/json_strict.h"
 
 namespace velkor::appindex {
 namespace {
@@ -45,27 +46,25 @@ void ReadRequest(Batch& batch, const std::string& line) {
   Json::Value request;
   if (!fromString(request, line)) return;
   int op = 0;
-  GetJsonValue(op, request, "op", true);
-  // What merely converts to an integer, such as true or 1.5, is no operation.
-  if (!request["op"].isInt()) throw Error(Error::kJsonError, "Not a string" + AppendData(request));
-  Json::Value path;
-  GetJsonValue(path, request, "path", false);
-  batch[path.isString() ? path.asString() : ""] = op;
+  std::string path;
+  GetStrictInt(op, request, "op", true);
+  GetStrictString(path, request, "path", false);
+  batch[path] = op;
 }
 
 // A request that cannot be read is logged and skipped: it must not hold up the others.
 void ReadLine(Batch& batch, const std::string& line) {
   constexpr CheckSite kBadRequest = {kIndexMgr, 350, "ProcessQueue"};
   constexpr CheckSite kFailedRequest = {kIndexMgr, 353, "ProcessQueue"};
-  const std::string failure = "ProcessQueue failed, cmd: " + line;
+  const auto failure = [&line] { return "ProcessQueue failed, cmd: " + line; };
   try {
     ReadRequest(batch, line);
   } catch (const Error& error) {
-    LogFailureText(kBadRequest, failure + ", reason: " + error.what());
+    LogFailureText(kBadRequest, failure() + ", reason: " + error.what());
   } catch (const abi::__forced_unwind&) {
     throw;  // the thread is being cancelled
   } catch (...) {
-    LogFailureText(kFailedRequest, failure);
+    LogFailureText(kFailedRequest, failure());
   }
 }
 
@@ -76,9 +75,11 @@ Batch ReadBatch(const std::string& queue_path_tmp) {
       {kIndexMgr, 340, "ProcessQueue"}, "!input_stream", Error::kGeneralError,
       [] { return std::string("Failed to open appindex queue, reason=") + std::strerror(errno); });
   Batch batch;
-  std::istringstream lines(text);
-  std::string line;
-  while (std::getline(lines, line)) ReadLine(batch, line);
+  for (std::size_t begin = 0; begin < text.size();) {
+    const std::size_t end = std::min(text.find('\n', begin), text.size());
+    ReadLine(batch, text.substr(begin, end - begin));
+    begin = end + 1;
+  }
   return batch;
 }
 
@@ -105,7 +106,9 @@ void ProcessQueue() {
     if (access(elastic::kElasticdSockPath, F_OK) != 0) return;  // no daemon: for a later call
 
     // A batch that an earlier call left unfinished comes first.
-    if (!IsFileExist(queue_path_tmp)) TakeQueue(queue_path, queue_path_tmp);
+    if (IsFileExist(queue_path) && !IsFileExist(queue_path_tmp)) {
+      TakeQueue(queue_path, queue_path_tmp);
+    }
     if (!IsFileExist(queue_path_tmp)) return;
     for (const auto& [path, op] : ReadBatch(queue_path_tmp)) Perform(op, path);
 

@@ -9,6 +9,7 @@
 #include "appindex/string_pool_internal.h"
 #include "appindex/utilities/file_utils.h"
 #include "appindex/utilities/json_helpers.h"
+#include "appindex/utils_internal.h"
 #include "common/check.h"
 #include "common/dir_reader.h"
 #include "device/tovo_webui.h"
@@ -18,7 +19,6 @@ namespace {
 
 constexpr char kBuiltInTextsRoot[] = "/usr/tovo/tovoman/webman/texts/";
 constexpr char kTextsDir[] = "texts";
-constexpr char kFallbackLang[] = "enu";
 constexpr int kMaxSearchDepth = 5;
 
 template <typename Texts>
@@ -74,7 +74,7 @@ bool FindPkgTextRoot(std::string& out, const std::string& find_dir, int depth) {
 LanguagePack::LanguagePack(const std::string& texts_root) {
   for (const std::string& lang : GetSupportedLangs()) {
     const Json::Value strings = TOVO::PMX::LocalizedStringParser::ParseTexts(texts_root + lang);
-    if (strings.size() == 0) continue;
+    if (strings.size() == 0) continue;  // a scalar too, which empty() would not tell
     Sections& sections = langs_[lang];
     if (strings.isObject()) FillSections(sections, strings);
   }
@@ -82,15 +82,15 @@ LanguagePack::LanguagePack(const std::string& texts_root) {
 
 std::string LanguagePack::GetString(const std::string& lang, const std::string& section,
                                     const std::string& key) const {
-  const std::string placeholder = section + ":" + key;
+  const auto placeholder = [&] { return section + ":" + key; };
   auto sections = langs_.find(lang);
-  if (sections == langs_.end()) sections = langs_.find(kFallbackLang);
-  if (sections == langs_.end()) return placeholder;
+  if (sections == langs_.end()) sections = langs_.find(kEnglish);
+  if (sections == langs_.end()) return placeholder();
   const auto texts = sections->second.find(section);
-  if (texts == sections->second.end() || !texts->second) return placeholder;
+  if (texts == sections->second.end() || !texts->second) return placeholder();
   const auto text = texts->second->find(key);
   if (text == texts->second->end()) return "";
-  return text->second.value_or(placeholder);
+  return text->second ? *text->second : placeholder();
 }
 
 StringPool::StringPool() : texts_root_(kBuiltInTextsRoot) {}

@@ -6,9 +6,9 @@
 #include <cstring>
 
 namespace velkor {
+namespace {
 
-void LogFailureText(const CheckSite& site, const std::string& text) {
-  const int failed_with = errno;
+void WriteLine(const CheckSite& site, int failed_with, const std::string& text) {
   const std::string suffix =
       failed_with == 0 ? "" : " [err: " + std::string(std::strerror(failed_with)) + "]";
   syslog(LOG_ERR, "%s:%d (%d, %u) (%s) %s%s", site.module, site.line, getpid(), geteuid(),
@@ -16,8 +16,18 @@ void LogFailureText(const CheckSite& site, const std::string& text) {
   errno = 0;  // also what syslog itself left, such as ENOENT where no log daemon listens
 }
 
+std::string FailedText(const char* condition) { return "Failed [" + std::string(condition) + "]"; }
+
+}  // namespace
+
+void LogFailureText(const CheckSite& site, const std::string& text) {
+  WriteLine(site, errno, text);
+}
+
 void LogFailure(bool ok, const CheckSite& site, const char* condition) {
-  if (!ok) LogFailureText(site, "Failed [" + std::string(condition) + "]");
+  if (ok) return;
+  const int failed_with = errno;
+  WriteLine(site, failed_with, FailedText(condition));
 }
 
 void LogNotice(const char* module, int line, const std::string& text) {
@@ -27,7 +37,8 @@ void LogNotice(const char* module, int line, const std::string& text) {
 }
 
 void LogFailedCheck(const CheckSite& site, const char* condition, const Error& error) {
-  LogFailureText(site, "Failed [" + std::string(condition) + "], reason: " + error.what());
+  const int failed_with = errno;
+  WriteLine(site, failed_with, FailedText(condition) + ", reason: " + error.what());
 }
 
 void CheckOrThrow(bool ok, const CheckSite& site, const char* condition, Error::ErrorCode code) {

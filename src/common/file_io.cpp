@@ -54,6 +54,7 @@ bool ReadRegularFile(const std::string& path, std::size_t limit, std::string& co
   if (fstat(fd.Get(), &info) != 0) return false;
   if (!S_ISREG(info.st_mode)) return FailWith(S_ISDIR(info.st_mode) ? EISDIR : EINVAL);
 
+  const int kept = errno;
   std::string text;
   std::array<char, 16384> chunk{};
   for (;;) {
@@ -67,6 +68,7 @@ bool ReadRegularFile(const std::string& path, std::size_t limit, std::string& co
     if (text.size() > limit) return FailWith(EFBIG);
   }
   content.swap(text);
+  errno = kept;  // a read that was interrupted and then went well is no failure
   return true;
 }
 

@@ -64,7 +64,7 @@ bool IsDirExist(const std::string& path, bool follow_link) {
     if (lstat(current.c_str(), &info) != 0) return false;
     if (S_ISDIR(info.st_mode)) return true;
     if (!S_ISLNK(info.st_mode) || !follow_link) return false;
-    if (!ReadLink(std::string(current), current)) return false;
+    if (!ReadLink(current, current)) return false;
   }
   return false;
 }

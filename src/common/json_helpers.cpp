@@ -1,19 +1,9 @@
 #include "appindex/utilities/json_helpers.h"
 
 #include "appindex/error.h"
+#include "common/json_strict.h"
 
 namespace velkor {
-namespace {
-
-// Calls visit(element) for the elements of an array and the member values of an object.
-template <typename Visit>
-void ForEachElement(const Json::Value& value, const Visit& visit) {
-  if (!value.isArray() && !value.isObject()) return;
-  for (const Json::Value& element : value) visit(element);
-}
-
-}  // namespace
-
 template <>
 bool isJsonType<std::string>(const Json::Value& value) {
   return value.isConvertibleTo(Json::stringValue);
@@ -76,17 +66,35 @@ const Json::Value* FindMember(const Json::Value& obj, const std::string& key, bo
   return member;
 }
 
-}  // namespace
-
-template <typename T>
-void GetJsonValue(T& out, const Json::Value& obj, const std::string& key, bool required) {
+// Reads a member that `accepts` holds for.
+template <typename T, typename Accepts>
+void ReadMember(T& out, const Json::Value& obj, const std::string& key, bool required,
+                const Accepts& accepts) {
   const Json::Value* member = FindMember(obj, key, required);
   if (member == nullptr) return;
-  if (isJsonType<T>(*member)) {
+  if (accepts(*member)) {
     out = asJsonType<T>(*member);
   } else if (required) {
     throw Error(Error::kJsonError, "Not a string" + AppendData(obj));
   }
+}
+
+template <typename T>
+bool IsReadable(const Json::Value& value) {
+  return isJsonType<T>(value);
+}
+
+// An integer of 64 bits without a sign has the type, but not always the range.
+template <>
+bool IsReadable<long long>(const Json::Value& value) {
+  return isJsonType<long long>(value) && value.isInt64();
+}
+
+}  // namespace
+
+template <typename T>
+void GetJsonValue(T& out, const Json::Value& obj, const std::string& key, bool required) {
+  ReadMember(out, obj, key, required, IsReadable<T>);
 }
 
 template <>
@@ -96,6 +104,15 @@ void GetJsonValue<Json::Value>(Json::Value& out, const Json::Value& obj, const s
   if (member == nullptr) return;
   Json::Value copy(*member);  // `out` may be `obj` itself
   out.swap(copy);
+}
+
+void GetStrictString(std::string& out, const Json::Value& obj, const std::string& key,
+                     bool required) {
+  ReadMember(out, obj, key, required, [](const Json::Value& value) { return value.isString(); });
+}
+
+void GetStrictInt(int& out, const Json::Value& obj, const std::string& key, bool required) {
+  ReadMember(out, obj, key, required, [](const Json::Value& value) { return value.isInt(); });
 }
 
 template void GetJsonValue<std::string>(std::string&, const Json::Value&, const std::string&, bool);
@@ -134,9 +151,9 @@ Json::Value Vec2JsonArr<std::string>(const std::vector<std::string>& items) {
 template <>
 std::vector<std::string> JsonArr2Vec<std::string>(const Json::Value& value) {
   std::vector<std::string> items;
-  ForEachElement(value, [&items](const Json::Value& element) {
+  for (const Json::Value& element : value) {
     if (isJsonType<std::string>(element)) items.push_back(element.asString());
-  });
+  }
   return items;
 }
 

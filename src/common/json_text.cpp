@@ -15,7 +15,7 @@ namespace {
 // 256 KiB, in builds with sanitizers too.
 constexpr int kMaxDepth = 128;
 
-constexpr std::size_t kMaxFileBytes = 16 * 1024 * 1024;
+constexpr std::size_t kMaxFileBytes = std::size_t{16} * 1024 * 1024;
 
 constexpr char kReplacementCharacter[] = "\xEF\xBF\xBD";
 

@@ -19,7 +19,9 @@ TEISEIGATRO_EXPORT Mutex& SDKMutex();
 class TEISEIGATRO_EXPORT SDKCredentials {
  public:
   // Remembers the current effective user, to whom the destructor switches back; does not switch.
-  // Throws Error 503 when the user database does not know the user.
+  // Throws Error 503 when the user database does not know the user, with the text
+  // "TOVOUserGetByUID failed, err=" less as many of its first characters as the device's error
+  // number says.
   SDKCredentials();
 
   // Switches to user `name`, as AsUser does. The destructor of this form switches to `name` again,
@@ -27,7 +29,8 @@ class TEISEIGATRO_EXPORT SDKCredentials {
   explicit SDKCredentials(const std::string& name);
 
   // Switches back when the effective user or group is not the one met at construction. Throws Error
-  // 503 when that fails; during the handling of another exception this ends the process.
+  // 503 without a reason when that fails; while another exception unwinds the stack, that ends the
+  // process.
   ~SDKCredentials() noexcept(false);
 
   SDKCredentials(const SDKCredentials&) = delete;

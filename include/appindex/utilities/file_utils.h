@@ -54,8 +54,8 @@ TEISEIGATRO_EXPORT std::string RealPath(const std::string& path);
 // otherwise.
 TEISEIGATRO_EXPORT bool Unlink(const std::string& path);
 
-// Copies or moves a file as the device's copy arguments say; true when done. MVFile moves, CPFile
-// copies. Block until done; false with errno set on failure.
+// Copies or moves a file as the device's copy arguments say (its own headers define them); true
+// when done. MVFile moves, CPFile copies. Block until done; false with errno set on failure.
 TEISEIGATRO_EXPORT bool MVFileImpl(const std::string& src, const std::string& dst,
                                    TOVOCOPYARGS* args);
 TEISEIGATRO_EXPORT bool MVFile(const std::string& src, const std::string& dst);

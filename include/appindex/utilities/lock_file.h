@@ -15,9 +15,11 @@ namespace velkor {
 class TEISEIGATRO_EXPORT LockFile {
  public:
   // Returns with the lock held; `exclusive` false asks for one that other shared holders may share.
-  // While it is held elsewhere, tries 64 times with random pauses of 0 to 0.9 s (57.6 s at most).
-  // Throws Error 506 when the file cannot be opened ("open failed, path=", logged too), when
-  // locking fails (the system's text) or after the last try ("Exceed max retry, path=").
+  // While it is held elsewhere, tries 64 times with random pauses of 0 to 0.9 s (57.6 s at most),
+  // which take from the process's rand() without seeding it. The file is opened with the effective
+  // user's rights. Throws Error 506 when the file cannot be opened ("open failed, path="; the cause
+  // is in the log line, the thrown text always ends in that of error 0), when locking fails (the
+  // system's text, not logged) or after the last try ("Exceed max retry, path=", not logged).
   LockFile(const std::string& path, bool exclusive);
 
   // Releases the lock at once and closes the file; never throws.

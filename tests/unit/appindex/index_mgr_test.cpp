@@ -222,6 +222,21 @@ TEST_F(IndexAdd, DaemonsOtherFailureReachesTheCallerWithItsCodeAndReason) {
   EXPECT_EQ(daemon.Connections(), 1);
 }
 
+TEST_F(IndexAdd, DaemonThatLosesEveryIndexEndsInItsErrorAndNotInRebuildsWithoutEnd) {
+  const std::string conf = Install("App");
+  ScriptedDaemon daemon([](const Json::Value& request) {
+    return request["command"] == "document_upsert_by_id" ? test::Failure(601, "none")
+                                                         : test::Success();
+  });
+  EXPECT_EQ(ThrownBy([&] { Add(conf, true); }).code, 601);
+  constexpr int kNestedRebuilds = 8;
+  EXPECT_EQ(daemon.Requests().size(), 1U + kNestedRebuilds * (21U * 2U + 1U));
+
+  // Nothing of it stays: the next call recovers again.
+  EXPECT_EQ(ThrownBy([&] { Add(conf, true); }).code, 601);
+  EXPECT_EQ(daemon.Requests().size(), 2U * (1U + kNestedRebuilds * (21U * 2U + 1U)));
+}
+
 TEST_F(IndexDel, DeletesAndCommitsEachLanguageInAscendingOrder) {
   ScriptedDaemon daemon(kSucceed);
   Del(Install("App"), true);

@@ -189,6 +189,13 @@ TEST(GetJsonValueTest, NullIsReadAsTheTypesOwnNothingButNotAsLongLong) {
   EXPECT_EQ(ReadOptional<long long>(R"({"a":null})", 7), 7);
 }
 
+TEST(GetJsonValueTest, AnIntegerBeyondLongLongIsOfTheWrongType) {
+  constexpr char kObject[] = R"({"a":9223372036854775808})";
+  EXPECT_EQ(ReadOptional<long long>(kObject, 7), 7);
+  EXPECT_EQ(ErrorOf<long long>(Parsed(kObject), true).code, Error::kJsonError);
+  EXPECT_EQ(ReadOptional<long long>(R"({"a":9223372036854775807})", 7), 9223372036854775807LL);
+}
+
 TEST(GetJsonValueTest, AJsonValueIsCopiedWhateverItsType) {
   for (const char* member : {"null", "1", "\"x\"", "[1,{}]", "{\"b\":2}"}) {
     const std::string obj = std::string(R"({"a":)") + member + "}";
