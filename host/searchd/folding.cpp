@@ -69,6 +69,10 @@ UChar32 AsHiragana(UChar32 c) {
 
 }  // namespace
 
+void LoadFolding() {
+  for (const auto get : {Nfc, Nfd, FoldingNfkc}) Normalize(get, UnicodeString());
+}
+
 UnicodeString Fold(const UnicodeString& text, bool turkic) {
   UnicodeString folded = text;
   folded.findAndReplace(UnicodeString(static_cast<UChar32>(0x200B)), UnicodeString(u' '));

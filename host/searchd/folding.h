@@ -7,6 +7,10 @@
 
 namespace searchd {
 
+// Loads what the functions here share, so that no two threads do it at once. Throws
+// std::runtime_error when ICU's data are missing.
+void LoadFolding();
+
 // Compatibility forms and width variants as one, case folded; with `turkic`, I becomes dotless i
 // and dotted I becomes i. A zero-width space, which parts words in Thai and Khmer, becomes a space.
 icu::UnicodeString Fold(const icu::UnicodeString& text, bool turkic);

@@ -11,6 +11,7 @@
 #include "host/searchd/catalog.h"
 #include "host/searchd/dispatcher.h"
 #include "host/searchd/durable_file.h"
+#include "host/searchd/folding.h"
 #include "host/searchd/options.h"
 #include "host/searchd/process.h"
 #include "host/searchd/server.h"
@@ -51,6 +52,7 @@ void Serve(const Options& options, Started started) {
 }
 
 void Start(const Options& options) {
+  LoadFolding();
   const int background_fd = options.foreground ? -1 : GoToBackground();
   const host::sdk::UniqueFd null(open("/dev/null", O_RDWR | O_CLOEXEC));
   if (!options.root.empty()) host::EnterDeviceRoot(options.root);
