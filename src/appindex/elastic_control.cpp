@@ -5,6 +5,7 @@
 #include <algorithm>
 #include <cstdlib>
 #include <iterator>
+#include <utility>
 
 #include "appindex/elastic_control_internal.h"
 #include "appindex/utilities/json_helpers.h"
@@ -92,11 +93,18 @@ bool PauseForRetry(int code) {
   return false;
 }
 
-Json::Value MakeRequest(const char* command, const std::string& lang) {
+// What every command's data begin with.
+Json::Value MakeData(const std::string& lang) {
+  Json::Value data(Json::objectValue);
+  data["id"] = GetAppIndexID(lang);
+  return data;
+}
+
+void SendCommand(const char* command, Json::Value data) {
   Json::Value request(Json::objectValue);
   request["command"] = command;
-  request["data"]["id"] = GetAppIndexID(lang);
-  return request;
+  request["data"] = std::move(data);
+  SendRequest(request);
 }
 
 }  // namespace
@@ -146,30 +154,31 @@ Json::Value GetAppIndexMappings() { return GetAppIndexMappings(kAppIndexMappings
 std::string GetAppIndexID(const std::string& lang) { return kIndexIdPrefix + lang; }
 
 void AppIndexCreate(const std::string& lang) {
-  Json::Value request = MakeRequest("index_create", lang);
-  request["data"]["path"] = kIndexDbDir + lang;
-  request["data"]["settings"] = Json::Value(Json::objectValue);
-  request["data"]["mappings"] = GetAppIndexMappings();
-  SendRequest(request);
+  Json::Value data = MakeData(lang);
+  data["path"] = kIndexDbDir + lang;
+  data["settings"] = Json::Value(Json::objectValue);
+  data["mappings"] = GetAppIndexMappings();
+  SendCommand("index_create", std::move(data));
 }
 
-void AppIndexDelete(const std::string& lang) { SendRequest(MakeRequest("index_delete", lang)); }
+void AppIndexDelete(const std::string& lang) { SendCommand("index_delete", MakeData(lang)); }
 
 void IndexUpsert(const std::string& lang, const Json::Value& doc) {
   std::string doc_id;
   GetStrictString(doc_id, doc, "id", true);
-  Json::Value request = MakeRequest("document_upsert_by_id", lang);
-  request["data"]["doc_id"] = doc_id;
-  request["data"]["data"] = doc;
-  SendRequest(request);
+
+  Json::Value data = MakeData(lang);
+  data["doc_id"] = doc_id;
+  data["data"] = doc;
+  SendCommand("document_upsert_by_id", std::move(data));
 }
 
 void IndexDelete(const std::string& lang, const std::string& doc_id) {
-  Json::Value request = MakeRequest("document_del_by_id", lang);
-  request["data"]["doc_id"] = doc_id;
-  SendRequest(request);
+  Json::Value data = MakeData(lang);
+  data["doc_id"] = doc_id;
+  SendCommand("document_del_by_id", std::move(data));
 }
 
-void IndexCommit(const std::string& lang) { SendRequest(MakeRequest("commit", lang)); }
+void IndexCommit(const std::string& lang) { SendCommand("commit", MakeData(lang)); }
 
 }  // namespace velkor::appindex::elastic

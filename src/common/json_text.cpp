@@ -2,6 +2,7 @@
 #include <json/reader.h>
 #include <json/writer.h>
 
+#include <array>
 #include <boost/locale/utf.hpp>
 #include <memory>
 
@@ -17,15 +18,17 @@ constexpr int kMaxDepth = 128;
 
 constexpr std::size_t kMaxFileBytes = std::size_t{16} * 1024 * 1024;
 
+constexpr std::size_t kUsualTextBytes = 1024;  // most requests to the search daemon
+
 constexpr char kReplacementCharacter[] = "\xEF\xBF\xBD";
 
-Json::CharReaderBuilder MakeStrictReaderBuilder() {
+std::unique_ptr<Json::CharReader> MakeStrictReader() {
   Json::CharReaderBuilder builder;
   Json::CharReaderBuilder::strictMode(&builder.settings_);
   builder.settings_["strictRoot"] = false;
   builder.settings_["skipBom"] = false;
   builder.settings_["stackLimit"] = kMaxDepth;
-  return builder;
+  return std::unique_ptr<Json::CharReader>(builder.newCharReader());
 }
 
 void AppendEscaped(std::string& out, char c) {
@@ -52,7 +55,13 @@ void AppendEscaped(std::string& out, char c) {
   }
 }
 
-bool NeedsEscape(char c) { return static_cast<unsigned char>(c) < 0x20 || c == '"' || c == '\\'; }
+// Which bytes stand for themselves in a JSON text: ASCII but for controls, quote and backslash.
+constexpr std::array<bool, 256> MakePlainBytes() {
+  std::array<bool, 256> plain{};
+  for (std::size_t byte = 0x20; byte < 0x80; ++byte) plain[byte] = byte != '"' && byte != '\\';
+  return plain;
+}
+constexpr std::array<bool, 256> kPlainBytes = MakePlainBytes();
 
 // Steps over one character that is not ASCII, or over one byte that is not UTF-8; tells which.
 bool SkipUtf8(const char*& p, const char* end) {
@@ -70,14 +79,14 @@ void AppendText(std::string& out, const char* begin, const char* end) {
   const char* run = begin;  // from here to p: not yet in `out`
   for (const char* p = begin; p != end;) {
     const char* at = p;
-    if (static_cast<signed char>(*p) < 0) {
-      if (SkipUtf8(p, end)) continue;
-      out.append(run, at) += kReplacementCharacter;
-      run = p;
-    } else {
+    const auto byte = static_cast<unsigned char>(*p);
+    if (kPlainBytes[byte]) {
       ++p;
-      if (!NeedsEscape(*at)) continue;
-      AppendEscaped(out.append(run, at), *at);
+    } else if (byte < 0x80) {
+      AppendEscaped(out.append(run, at), *p);
+      run = ++p;
+    } else if (!SkipUtf8(p, end)) {
+      out.append(run, at) += kReplacementCharacter;
       run = p;
     }
   }
@@ -148,8 +157,8 @@ void AppendValue(std::string& out, const Json::Value& value) {
 bool fromString(Json::Value& value, const std::string& text) {
   // The reader takes a NUL for the end of the text and would accept anything behind it.
   if (text.find('\0') != std::string::npos) return false;
-  static const Json::CharReaderBuilder builder = MakeStrictReaderBuilder();
-  const std::unique_ptr<Json::CharReader> reader(builder.newCharReader());
+  // Making a reader costs more than most texts; each parse begins afresh.
+  thread_local const std::unique_ptr<Json::CharReader> reader = MakeStrictReader();
   Json::Value parsed;
   try {
     if (!reader->parse(text.data(), text.data() + text.size(), &parsed, nullptr)) return false;
@@ -162,6 +171,7 @@ bool fromString(Json::Value& value, const std::string& text) {
 
 std::string toString(const Json::Value& value) {
   std::string text;
+  text.reserve(kUsualTextBytes);
   AppendValue(text, value);
   return text;
 }
