@@ -1,5 +1,6 @@
 #include "device/tovodaemon.h"
 
+#include <fcntl.h>
 #include <sys/socket.h>
 #include <sys/time.h>
 #include <sys/un.h>
@@ -60,6 +61,17 @@ bool ConnectWithin(int fd, const sockaddr_un& address, long timeout_seconds) {
   return SetSendTimeout(fd, microseconds(0));
 }
 
+bool SetBlocking(int fd) { return fcntl(fd, F_SETFL, 0) == 0; }
+
+// Connects a socket that does not block yet, and makes it block. As a rule there is room at once;
+// EAGAIN says that the listener's queue is full.
+bool ConnectNewSocket(int fd, const sockaddr_un& address, long timeout_seconds) {
+  if (connect(fd, reinterpret_cast<const sockaddr*>(&address), sizeof(address)) == 0) {
+    return SetBlocking(fd);
+  }
+  return errno == EAGAIN && SetBlocking(fd) && ConnectWithin(fd, address, timeout_seconds);
+}
+
 }  // namespace
 
 SockConnection::SockConnection() : fd_(-1) {}
@@ -90,8 +102,8 @@ bool DomainSockConnection::Connect(long timeout_seconds) {
   const int error_before = errno;
   sockaddr_un address;
   if (!MakeAddress(path_, address)) return false;
-  host::sdk::UniqueFd fd(socket(AF_UNIX, SOCK_STREAM | SOCK_CLOEXEC, 0));
-  if (!fd.IsOpen() || !ConnectWithin(fd.Get(), address, timeout_seconds)) return false;
+  host::sdk::UniqueFd fd(socket(AF_UNIX, SOCK_STREAM | SOCK_CLOEXEC | SOCK_NONBLOCK, 0));
+  if (!fd.IsOpen() || !ConnectNewSocket(fd.Get(), address, timeout_seconds)) return false;
   fd_ = fd.Release();
   errno = error_before;
   return true;

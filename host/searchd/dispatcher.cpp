@@ -14,6 +14,9 @@
 namespace searchd {
 namespace {
 
+constexpr std::size_t kMaxQuickBytes = std::size_t{16} * 1024;
+constexpr std::size_t kCommandNameWithin = 64;
+
 constexpr unsigned kDefaultLimit = 20;
 constexpr unsigned kMaxLimit = 1000;
 constexpr unsigned kMaxOffset = 1000000;
@@ -52,6 +55,11 @@ void CheckSettings(const Json::Value& settings) {
 Json::Value Nothing() { return Json::Value(Json::objectValue); }
 
 }  // namespace
+
+// Changes of a document are queued, not carried out.
+bool Dispatcher::IsQuick(const std::string& request) {
+  return request.size() <= kMaxQuickBytes && request.find("\"document_") < kCommandNameWithin;
+}
 
 Answer Dispatcher::Handle(const std::string& request, uid_t client) {
   Answer answer;

@@ -14,6 +14,7 @@ class Dispatcher : public Handler {
  public:
   explicit Dispatcher(Catalog& catalog) : catalog_(catalog) {}
 
+  bool IsQuick(const std::string& request) override;
   Answer Handle(const std::string& request, uid_t client) override;
   std::string TooLong() override;
   bool HasIdleWork() override;

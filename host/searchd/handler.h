@@ -18,6 +18,9 @@ class Handler {
  public:
   virtual ~Handler() = default;
 
+  // A guess from a glance: whether the request is answered sooner than another thread is woken.
+  virtual bool IsQuick(const std::string& request) = 0;
+
   // Answers one request; `client` is the effective user id of who connected.
   virtual Answer Handle(const std::string& request, uid_t client) = 0;
 

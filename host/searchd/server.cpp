@@ -53,19 +53,31 @@ void Server::Run(unsigned threads) {
 
 void Server::Work() {
   for (;;) {
-    Job job;
+    Task task;
     {
       const std::lock_guard lock(turn_);
-      if (!stopped_) job = WaitForJob();
+      while (!stopped_ && !task) task = NextTask();
       if (stopped_) return;
     }
-    if (job.connection) Serve(std::move(job.connection));
-    if (job.idle_work) handler_.DoIdleWork();
+    task();
   }
 }
 
-void Server::Serve(std::unique_ptr<Connection> connection) {
-  const Answer answer = handler_.Handle(connection->TakeRequest(), connection->Client());
+// Answers quick requests on the way: for them alone it is not worth waking the next thread.
+Server::Task Server::NextTask() {
+  std::shared_ptr<Connection> connection = WaitForRequest();
+  if (stopped_) return nullptr;
+  if (!connection) return [this] { handler_.DoIdleWork(); };
+  std::string request = connection->TakeRequest();
+  if (handler_.IsQuick(request)) return Serve(std::move(connection), request);
+  return [this, connection = std::move(connection), request = std::move(request)]() mutable {
+    if (const Task after = Serve(std::move(connection), request)) after();
+  };
+}
+
+// Returns what is to be done when the reply is on its way.
+Server::Task Server::Serve(std::shared_ptr<Connection> connection, const std::string& request) {
+  Answer answer = handler_.Handle(request, connection->Client());
   connection->Reply(answer.text, Clock::now() + time_limit_);
   if (connection->GetState() == State::kSending) {
     {
@@ -74,8 +86,7 @@ void Server::Serve(std::unique_ptr<Connection> connection) {
     }
     eventfd_write(wake_.Get(), 1);
   }
-  connection.reset();
-  if (answer.after) answer.after();
+  return std::move(answer.after);
 }
 
 void Server::FinishSending() {
@@ -90,17 +101,18 @@ void Server::FinishSending() {
   connections_.clear();
 }
 
-Server::Job Server::WaitForJob() {
+// Returns a connection with a complete request, or null when it is time to stop or to do idle work.
+std::shared_ptr<Connection> Server::WaitForRequest() {
   for (;;) {
     DropExpired();
     UpdateListening();
     const bool idle_work = handler_.HasIdleWork();
     epoll_event event{};
     const int found = epoll_wait(events_.Get(), &event, 1, WaitMilliseconds(idle_work));
-    if (found == 0 && idle_work) return {nullptr, true};
+    if (found == 0 && idle_work) return nullptr;
     if (found <= 0) continue;
-    if (auto connection = HandleEvent(event.data.fd)) return {std::move(connection), false};
-    if (stopped_) return {};
+    if (auto connection = HandleEvent(event.data.fd)) return connection;
+    if (stopped_) return nullptr;
   }
 }
 
@@ -115,7 +127,7 @@ int Server::WaitMilliseconds(bool idle_work) const {
 }
 
 // Returns a connection whose request is complete.
-std::unique_ptr<Connection> Server::HandleEvent(int fd) {
+std::shared_ptr<Connection> Server::HandleEvent(int fd) {
   if (fd == listener_.Get()) return Accept();
   if (fd == stop_signals_.Get()) {
     stopped_ = true;
@@ -127,14 +139,14 @@ std::unique_ptr<Connection> Server::HandleEvent(int fd) {
   }
   const auto found = connections_.find(fd);
   if (found == connections_.end()) return nullptr;
-  std::unique_ptr<Connection> connection = std::move(found->second);
+  std::shared_ptr<Connection> connection = std::move(found->second);
   connections_.erase(found);
   Unwatch(fd);
   connection->Continue();
   return Continue(std::move(connection));
 }
 
-std::unique_ptr<Connection> Server::Accept() {
+std::shared_ptr<Connection> Server::Accept() {
   const int fd = accept4(listener_.Get(), nullptr, nullptr, SOCK_CLOEXEC | SOCK_NONBLOCK);
   if (fd < 0) {
     if (errno == EMFILE || errno == ENFILE || errno == ENOBUFS || errno == ENOMEM) {
@@ -143,13 +155,13 @@ std::unique_ptr<Connection> Server::Accept() {
     }
     return nullptr;
   }
-  auto connection = std::make_unique<Connection>(fd, Clock::now() + time_limit_);
+  auto connection = std::make_shared<Connection>(fd, Clock::now() + time_limit_);
   connection->Continue();
   return Continue(std::move(connection));
 }
 
 // Sees to it that a connection goes on from the state that it is in.
-std::unique_ptr<Connection> Server::Continue(std::unique_ptr<Connection> connection) {
+std::shared_ptr<Connection> Server::Continue(std::shared_ptr<Connection> connection) {
   if (connection->GetState() == State::kTooLong) {
     connection->Reply(handler_.TooLong(), Clock::now() + time_limit_);
   }
@@ -164,7 +176,7 @@ std::unique_ptr<Connection> Server::Continue(std::unique_ptr<Connection> connect
 void Server::TakeBack() {
   eventfd_t count = 0;
   eventfd_read(wake_.Get(), &count);
-  std::vector<std::unique_ptr<Connection>> returned;
+  std::vector<std::shared_ptr<Connection>> returned;
   {
     const std::lock_guard lock(returned_mutex_);
     returned.swap(returned_);

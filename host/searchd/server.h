@@ -6,6 +6,7 @@
 #pragma once
 
 #include <chrono>
+#include <functional>
 #include <map>
 #include <memory>
 #include <mutex>
@@ -36,22 +37,19 @@ class Server {
   using TimePoint = Connection::TimePoint;
   using Clock = std::chrono::steady_clock;
 
-  // What the waiting thread has found to do.
-  struct Job {
-    std::unique_ptr<Connection> connection;  // with a complete request
-    bool idle_work = false;
-  };
+  using Task = std::function<void()>;
 
   void Work();
-  void Serve(std::unique_ptr<Connection> connection);
+  Task Serve(std::shared_ptr<Connection> connection, const std::string& request);
   void FinishSending();
 
   // For the thread that waits, with turn_ held.
-  Job WaitForJob();
+  Task NextTask();
+  std::shared_ptr<Connection> WaitForRequest();
   int WaitMilliseconds(bool idle_work) const;
-  std::unique_ptr<Connection> HandleEvent(int fd);
-  std::unique_ptr<Connection> Accept();
-  std::unique_ptr<Connection> Continue(std::unique_ptr<Connection> connection);
+  std::shared_ptr<Connection> HandleEvent(int fd);
+  std::shared_ptr<Connection> Accept();
+  std::shared_ptr<Connection> Continue(std::shared_ptr<Connection> connection);
   void TakeBack();
   void DropExpired();
   void UpdateListening();
@@ -66,13 +64,13 @@ class Server {
   const std::chrono::milliseconds time_limit_;
 
   std::mutex turn_;  // held by the thread that waits; guards what follows
-  std::map<int, std::unique_ptr<Connection>> connections_;
+  std::map<int, std::shared_ptr<Connection>> connections_;
   bool listening_ = false;
   TimePoint accept_again_;  // set after the system had no descriptor to give
   bool stopped_ = false;
 
   std::mutex returned_mutex_;
-  std::vector<std::unique_ptr<Connection>> returned_;  // whose replies take more than one send
+  std::vector<std::shared_ptr<Connection>> returned_;  // whose replies take more than one send
 };
 
 }  // namespace searchd
