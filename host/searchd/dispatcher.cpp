@@ -29,6 +29,13 @@ std::string FailureText(Code code, const std::string& message) {
   return JsonText(reply);
 }
 
+// Most replies say nothing more.
+std::string SuccessText(Json::Value reply) {
+  if (reply.empty()) return R"({"success":true})";
+  reply["success"] = true;
+  return JsonText(reply);
+}
+
 std::string RequiredString(const Json::Value& data, const char* member) {
   if (!data[member].isString()) {
     throw RequestError(Code::kRejected, std::string("\"") + member + "\" must be a string");
@@ -64,9 +71,7 @@ bool Dispatcher::IsQuick(const std::string& request) {
 Answer Dispatcher::Handle(const std::string& request, uid_t client) {
   Answer answer;
   try {
-    Json::Value reply = Run(request, client, answer.after);
-    reply["success"] = true;
-    answer.text = JsonText(reply);
+    answer.text = SuccessText(Run(request, client, answer.after));
     if (answer.text.size() > host::kMaxFrameBytes) {
       throw RequestError(Code::kRejected, "the reply would be too long: ask for fewer hits");
     }

@@ -26,7 +26,7 @@ constexpr const char* kStateDirectory = "/var/lib/tovoelasticd";
 constexpr const char* kLockFile = "/var/lib/tovoelasticd/lock";
 constexpr const char* kRegistryFile = "/var/lib/tovoelasticd/indexes.json";
 
-constexpr unsigned kThreads = 8;
+constexpr unsigned kWorkers = 7;
 constexpr int kFailure = 1;
 constexpr int kWrongUsage = 2;
 constexpr int kAlreadyRunning = 3;
@@ -47,7 +47,7 @@ void Serve(const Options& options, Started started) {
   Server server(dispatcher, listener, stop_signals, options.time_limit);
   syslog(LOG_NOTICE, "started, %zu indexes", catalog.All().size());
   started();
-  server.Run(kThreads);
+  server.Run(kWorkers);
   syslog(LOG_NOTICE, "stopped");
 }
 

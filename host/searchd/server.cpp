@@ -43,35 +43,60 @@ Server::Server(Handler& handler, int listener, int stop_signals, milliseconds ti
   Watch(stop_signals_.Get(), EPOLLIN);
 }
 
-void Server::Run(unsigned threads) {
-  std::vector<std::thread> others;
-  for (unsigned i = 1; i < threads; ++i) others.emplace_back([this] { Work(); });
-  Work();
-  for (std::thread& other : others) other.join();
+void Server::Run(unsigned workers) {
+  std::vector<std::thread> threads;
+  for (unsigned i = 0; i < workers; ++i) threads.emplace_back([this] { Work(); });
+  while (Task task = NextTask()) Post(std::move(task));
+  for (unsigned i = 0; i < workers; ++i) Post(nullptr);
+  for (std::thread& thread : threads) thread.join();
   FinishSending();
 }
 
+void Server::Post(Task task) {
+  const std::lock_guard lock(tasks_mutex_);
+  tasks_.push_back(std::move(task));
+  posted_.notify_one();
+}
+
+// Carries out tasks until an empty one says that there are no more.
 void Server::Work() {
   for (;;) {
     Task task;
     {
-      const std::lock_guard lock(turn_);
-      while (!stopped_ && !task) task = NextTask();
-      if (stopped_) return;
+      std::unique_lock lock(tasks_mutex_);
+      posted_.wait(lock, [this] { return !tasks_.empty(); });
+      task = std::move(tasks_.front());
+      tasks_.pop_front();
     }
+    if (!task) return;
     task();
   }
 }
 
-// Answers quick requests on the way: for them alone it is not worth waking the next thread.
+// Waits for something that a worker is to do; none when it is time to stop. Answers quick requests
+// on the way: for them it is not worth waking a worker.
 Server::Task Server::NextTask() {
-  std::shared_ptr<Connection> connection = WaitForRequest();
-  if (stopped_) return nullptr;
-  if (!connection) return [this] { handler_.DoIdleWork(); };
-  std::string request = connection->TakeRequest();
-  if (handler_.IsQuick(request)) return Serve(std::move(connection), request);
-  return [this, connection = std::move(connection), request = std::move(request)]() mutable {
-    if (const Task after = Serve(std::move(connection), request)) after();
+  for (;;) {
+    std::shared_ptr<Connection> connection = WaitForRequest();
+    if (stopped_) return nullptr;
+    if (!connection) return IdleTask();
+    std::string request = connection->TakeRequest();
+    if (!handler_.IsQuick(request)) {
+      return [this, connection = std::move(connection), request = std::move(request)]() mutable {
+        if (const Task after = Serve(std::move(connection), request)) after();
+      };
+    }
+    if (Task after = Serve(std::move(connection), request)) return after;
+  }
+}
+
+// One at a time; its end wakes the waiting thread, which then looks whether there is more to do.
+Server::Task Server::IdleTask() {
+  idle_work_runs_ = true;
+  return [this] {
+    handler_.DoIdleWork();
+    idle_work_runs_ = false;
+    eventfd_write(wake_.Get(), 1);
   };
 }
 
@@ -106,7 +131,7 @@ std::shared_ptr<Connection> Server::WaitForRequest() {
   for (;;) {
     DropExpired();
     UpdateListening();
-    const bool idle_work = handler_.HasIdleWork();
+    const bool idle_work = !idle_work_runs_ && handler_.HasIdleWork();
     epoll_event event{};
     const int found = epoll_wait(events_.Get(), &event, 1, WaitMilliseconds(idle_work));
     if (found == 0 && idle_work) return nullptr;

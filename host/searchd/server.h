@@ -1,11 +1,13 @@
 // Serving connections: one request and one reply each.
 //
-// A few threads take turns. One of them waits on all sockets at once; when a request is complete it
-// lets another take its place and answers. So no thread ever waits for a single client, and a
-// request is answered by the thread that received it.
+// One thread waits on all sockets at once and answers what takes no time; the rest it hands to a few
+// workers. So no thread ever waits for a single client, and no search or commit holds up another.
 #pragma once
 
+#include <atomic>
 #include <chrono>
+#include <condition_variable>
+#include <deque>
 #include <functional>
 #include <map>
 #include <memory>
@@ -28,9 +30,10 @@ class Server {
   // std::runtime_error.
   Server(Handler& handler, int listener, int stop_signals, std::chrono::milliseconds time_limit);
 
-  // Serves with `threads` threads, the caller's included. Returns after a stop signal, when the
-  // requests at hand are answered; requests that are not complete then are dropped.
-  void Run(unsigned threads);
+  // Serves: the caller's thread waits for requests and answers quick ones, `workers` threads (one
+  // or more) answer the others. Returns after a stop signal, when the requests at hand are
+  // answered; requests that are not complete then are dropped.
+  void Run(unsigned workers);
 
  private:
   using State = Connection::State;
@@ -40,11 +43,13 @@ class Server {
   using Task = std::function<void()>;
 
   void Work();
+  void Post(Task task);
   Task Serve(std::shared_ptr<Connection> connection, const std::string& request);
   void FinishSending();
 
-  // For the thread that waits, with turn_ held.
+  // For the thread that waits.
   Task NextTask();
+  Task IdleTask();
   std::shared_ptr<Connection> WaitForRequest();
   int WaitMilliseconds(bool idle_work) const;
   std::shared_ptr<Connection> HandleEvent(int fd);
@@ -63,11 +68,16 @@ class Server {
   const host::sdk::UniqueFd wake_;
   const std::chrono::milliseconds time_limit_;
 
-  std::mutex turn_;  // held by the thread that waits; guards what follows
+  // The waiting thread's own.
   std::map<int, std::shared_ptr<Connection>> connections_;
   bool listening_ = false;
   TimePoint accept_again_;  // set after the system had no descriptor to give
   bool stopped_ = false;
+
+  std::mutex tasks_mutex_;
+  std::condition_variable posted_;
+  std::deque<Task> tasks_;
+  std::atomic<bool> idle_work_runs_ = false;
 
   std::mutex returned_mutex_;
   std::vector<std::shared_ptr<Connection>> returned_;  // whose replies take more than one send
