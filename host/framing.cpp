@@ -9,7 +9,6 @@
 namespace host {
 namespace {
 
-constexpr std::size_t kHeaderBytes = 4;
 // Grown as the bytes arrive, so that a length alone never makes the receiver take 16 MiB.
 constexpr std::size_t kReceiveStep = 65536;
 
@@ -48,28 +47,37 @@ bool FailWith(int error) {
 
 }  // namespace
 
+std::string FrameHeader(std::size_t length) {
+  std::string header;
+  for (const unsigned shift : {24U, 16U, 8U, 0U}) {
+    header.push_back(static_cast<char>((length >> shift) & 0xFFU));
+  }
+  return header;
+}
+
+std::size_t FrameLength(const char* header) {
+  std::size_t length = 0;
+  for (std::size_t i = 0; i < kFrameHeaderBytes; ++i) {
+    length = (length << 8U) | static_cast<unsigned char>(header[i]);
+  }
+  return length;
+}
+
 bool SendFrame(int fd, const std::string& message) {
   if (message.size() > kMaxFrameBytes) return FailWith(EMSGSIZE);
-  const auto size = static_cast<unsigned>(message.size());
-  std::string frame;
-  frame.reserve(kHeaderBytes + message.size());
-  for (const unsigned shift : {24U, 16U, 8U, 0U}) {
-    frame.push_back(static_cast<char>((size >> shift) & 0xFFU));
-  }
-  frame += message;
+  const std::string frame = FrameHeader(message.size()) + message;
   return SendAll(fd, frame.data(), frame.size());
 }
 
 bool RecvFrame(int fd, std::string& message) {
   message.clear();
-  std::array<char, kHeaderBytes> header{};
+  std::array<char, kFrameHeaderBytes> header{};
   const ssize_t got = RecvAll(fd, header.data(), header.size());
   if (got < 0) return false;
   if (got == 0) return FailWith(0);
   if (got < static_cast<ssize_t>(header.size())) return FailWith(EPROTO);
 
-  std::size_t left = 0;
-  for (const char byte : header) left = (left << 8U) | static_cast<unsigned char>(byte);
+  std::size_t left = FrameLength(header.data());
   if (left > kMaxFrameBytes) return FailWith(EMSGSIZE);
 
   std::string text;

@@ -10,6 +10,11 @@ namespace host {
 // The longest message: larger than any search document, small enough to hold in memory many times.
 constexpr std::size_t kMaxFrameBytes = std::size_t{16} * 1024 * 1024;
 
+// How many bytes the length takes, and those bytes from and to the length.
+constexpr std::size_t kFrameHeaderBytes = 4;
+std::string FrameHeader(std::size_t length);
+std::size_t FrameLength(const char* header);
+
 // Sends one message on the blocking socket `fd`. False, with errno set, when the peer is gone
 // (EPIPE, without the signal), the message is too long (EMSGSIZE) or the socket fails.
 bool SendFrame(int fd, const std::string& message);

@@ -23,7 +23,7 @@ int Bind() {
   const int fd = socket(AF_UNIX, SOCK_DGRAM | SOCK_CLOEXEC, 0);
   sockaddr_un address{};
   address.sun_family = AF_UNIX;
-  std::strcpy(address.sun_path, kSocket);
+  std::strncpy(address.sun_path, kSocket, sizeof(address.sun_path) - 1);
   unlink(kSocket);
   if (fd < 0 || bind(fd, reinterpret_cast<sockaddr*>(&address), sizeof(address)) != 0 ||
       chmod(kSocket, 0666) != 0) {

@@ -21,7 +21,7 @@ std::string Exchange(const std::string& request) {
   const int fd = socket(AF_UNIX, SOCK_STREAM | SOCK_CLOEXEC, 0);
   sockaddr_un address{};
   address.sun_family = AF_UNIX;
-  std::strcpy(address.sun_path, kSocket);
+  std::strncpy(address.sun_path, kSocket, sizeof(address.sun_path) - 1);
   std::string reply;
   errno = 0;
   const bool done = fd >= 0 &&

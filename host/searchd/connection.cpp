@@ -12,25 +12,8 @@
 namespace searchd {
 namespace {
 
-constexpr std::size_t kHeaderBytes = 4;
 constexpr std::size_t kReceiveStep = 64 * 1024;
 constexpr uid_t kNobody = 65534;
-
-std::size_t FrameLength(const std::string& bytes) {
-  std::size_t length = 0;
-  for (std::size_t i = 0; i < kHeaderBytes; ++i) {
-    length = (length << 8U) | static_cast<unsigned char>(bytes[i]);
-  }
-  return length;
-}
-
-std::string FrameHeader(std::size_t length) {
-  std::string header;
-  for (const unsigned shift : {24U, 16U, 8U, 0U}) {
-    header.push_back(static_cast<char>((length >> shift) & 0xFFU));
-  }
-  return header;
-}
 
 uid_t PeerOf(int fd) {
   ucred peer{};
@@ -50,11 +33,11 @@ void Connection::Continue() {
 
 std::string Connection::TakeRequest() {
   std::string request = std::exchange(bytes_, {});
-  return request.substr(kHeaderBytes);
+  return request.substr(host::kFrameHeaderBytes);
 }
 
 void Connection::Reply(const std::string& text, TimePoint deadline) {
-  bytes_ = FrameHeader(text.size()) + text;
+  bytes_ = host::FrameHeader(text.size()) + text;
   sent_ = 0;
   deadline_ = deadline;
   state_ = State::kSending;
@@ -77,12 +60,12 @@ void Connection::Receive() {
 }
 
 void Connection::CheckFrame() {
-  if (bytes_.size() < kHeaderBytes) return;
-  const std::size_t length = FrameLength(bytes_);
+  if (bytes_.size() < host::kFrameHeaderBytes) return;
+  const std::size_t length = host::FrameLength(bytes_.data());
   if (length > host::kMaxFrameBytes) {
     state_ = State::kTooLong;
-  } else if (bytes_.size() >= kHeaderBytes + length) {
-    bytes_.resize(kHeaderBytes + length);
+  } else if (bytes_.size() >= host::kFrameHeaderBytes + length) {
+    bytes_.resize(host::kFrameHeaderBytes + length);
     state_ = State::kReceived;
   }
 }
