@@ -1,7 +1,8 @@
 // Serving connections: one request and one reply each.
 //
-// One thread waits on all sockets at once and answers what takes no time; the rest it hands to a few
-// workers. So no thread ever waits for a single client, and no search or commit holds up another.
+// One thread waits on all sockets at once and answers what takes no time; the rest it hands to a
+// few workers. So no thread ever waits for a single client, and no search or commit holds up
+// another.
 #pragma once
 
 #include <atomic>
