@@ -109,10 +109,9 @@ void SendCommand(const char* command, Json::Value data) {
 
 }  // namespace
 
-void SendRequestImpl(Json::Value& response, const Json::Value& request) {
+void SendRequestImpl(Json::Value& response, const std::string& request_text) {
   WaitForSocket();
 
-  const std::string request_text = toString(request);
   tovodaemon::DomainSockConnection conn(kElasticdSockPath);
   CheckOrThrow(conn.Connect(kElasticdConnectTimeout), {kModule, 84, "SendRequestImpl"},
                "!conn.Connect(kElasticdConnectTimeout)", Error::kElasticdRequestError,
@@ -130,11 +129,17 @@ void SendRequestImpl(Json::Value& response, const Json::Value& request) {
   conn.Disconnect();
 }
 
-void SendRequest(const Json::Value& request) {
+void SendRequestImpl(Json::Value& response, const Json::Value& request) {
+  SendRequestImpl(response, toString(request));
+}
+
+void SendRequest(const Json::Value& request) { SendRequest(toString(request)); }
+
+void SendRequest(const std::string& request_text) {
   Json::Value response;
   for (;;) {
     try {
-      SendRequestImpl(response, request);
+      SendRequestImpl(response, request_text);
       return;
     } catch (const Error& error) {
       if (!PauseForRetry(error.code)) throw;
@@ -167,10 +172,10 @@ void IndexUpsert(const std::string& lang, const Json::Value& doc) {
   std::string doc_id;
   GetStrictString(doc_id, doc, "id", true);
 
-  Json::Value data = MakeData(lang);
-  data["doc_id"] = doc_id;
-  data["data"] = doc;
-  SendCommand("document_upsert_by_id", std::move(data));
+  // Put together as text: a Json::Value of the request would copy the whole document.
+  SendRequest(R"({"command":"document_upsert_by_id","data":{"id":)" +
+              toString(GetAppIndexID(lang)) + R"(,"doc_id":)" + toString(doc_id) + R"(,"data":)" +
+              toString(doc) + "}}");
 }
 
 void IndexDelete(const std::string& lang, const std::string& doc_id) {

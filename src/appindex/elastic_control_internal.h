@@ -17,10 +17,12 @@ constexpr char kIndexDbDir[] = "/var/packages/Velkor/etc/appindex.db/";
 // reports success; otherwise throws Error 913 (transport), the daemon's own code, or 120 (a failure
 // reply without code or text). `response` is untouched when no reply could be parsed.
 void SendRequestImpl(Json::Value& response, const Json::Value& request);
+void SendRequestImpl(Json::Value& response, const std::string& request_text);
 
 // The same, again and again while the daemon answers that its database is not ready or that it is
 // busy. The reply is dropped.
 void SendRequest(const Json::Value& request);
+void SendRequest(const std::string& request_text);
 
 // The schema of an app index as the daemon is told it. Throws Error 502, logged, when `mappings` is
 // not JSON.
