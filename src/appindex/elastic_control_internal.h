@@ -15,7 +15,8 @@ constexpr char kIndexDbDir[] = "/var/packages/Velkor/etc/appindex.db/";
 
 // Sends one request on a connection of its own and puts the daemon's reply into `response` when it
 // reports success; otherwise throws Error 913 (transport), the daemon's own code, or 120 (a failure
-// reply without code or text). `response` is untouched when no reply could be parsed.
+// reply without a code or without a text). `response` is untouched when no reply could be parsed.
+// The request is given as a value or, by a caller that has it already, as its JSON text.
 void SendRequestImpl(Json::Value& response, const Json::Value& request);
 void SendRequestImpl(Json::Value& response, const std::string& request_text);
 
