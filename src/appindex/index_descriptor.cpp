@@ -7,6 +7,7 @@
 #include "appindex/utilities/json_helpers.h"
 #include "common/check.h"
 #include "common/dir_reader.h"
+#include "common/file_io.h"
 
 namespace velkor::appindex {
 namespace {
@@ -65,19 +66,28 @@ void AppendEntry(Json::Value& records, const std::string& conf_path, const Json:
 
 }  // namespace
 
-Json::Value FindIndexables(const std::string& conf_path) {
+Json::Value Descriptor::FindIndexables() {
   Json::Value records(Json::arrayValue);
-  Json::Value root;
-  if (!fromFile(root, conf_path)) {
-    LogMalformed(conf_path);
+  if (!Read()) {
+    LogMalformed(conf_path_);
     return records;
   }
+  const Json::Value& root = root_;
   if (root.isObject()) {
-    AppendEntry(records, conf_path, root);
+    AppendEntry(records, conf_path_, root);
   } else {
-    for (const Json::Value& entry : root) AppendEntry(records, conf_path, entry);
+    for (const Json::Value& entry : root) AppendEntry(records, conf_path_, entry);
   }
   return records;
+}
+
+bool Descriptor::Read() {
+  std::string text;
+  if (!ReadRegularFile(conf_path_, kMaxJsonFileBytes, text)) return false;
+  if (text == text_) return true;
+  if (!fromString(root_, text)) return false;
+  text_ = std::move(text);
+  return true;
 }
 
 bool FindIndexConfByAppRoot(std::string& conf_path, const std::string& find_dir, unsigned depth) {

@@ -39,8 +39,9 @@ void RecoverByRebuild() {
 }
 
 void AddInEveryLanguage(const std::string& conf_path, bool commit) {
+  Descriptor descriptor(conf_path);
   for (const std::string& lang : GetSupportedLangs()) {
-    for (const Json::Value& record : FindIndexables(conf_path)) {
+    for (const Json::Value& record : descriptor.FindIndexables()) {
       const Json::Value doc = MakeDocument(string_pool, lang, record);
       usleep(kUpsertPauseMicroseconds);
       elastic::IndexUpsert(lang, doc);
@@ -76,8 +77,9 @@ void Add(const std::string& conf_path, bool commit) {
 void Del(const std::string& conf_path, bool commit) {
   if (Basename(conf_path) != kIndexConf) return;
   LogNotice(kIndexMgr, 255, "Del: " + conf_path);
+  Descriptor descriptor(conf_path);
   for (const std::string& lang : GetSupportedLangs()) {
-    for (const Json::Value& record : FindIndexables(conf_path)) {
+    for (const Json::Value& record : descriptor.FindIndexables()) {
       elastic::IndexDelete(lang, record["id"].asString());
     }
     if (commit) elastic::IndexCommit(lang);

@@ -4,8 +4,10 @@
 
 #include <json/value.h>
 
+#include <optional>
 #include <set>
 #include <string>
+#include <utility>
 
 #include "appindex/string_pool.h"
 
@@ -14,11 +16,30 @@ namespace velkor::appindex {
 constexpr char kIndexMgr[] = "index_mgr";  // the module's name in log lines
 constexpr char kIndexConf[] = "index.conf";
 
-// Reads a descriptor and gives the array of its indexable records, those that the device filters
-// let pass, in file order: each an object with "path", "id", "title", "desc", "keywords",
-// "stringset" and "owner". A file that cannot be read or parsed is logged and gives none; so is a
-// module whose id cannot be made into text. Throws only what IsPassFilter throws.
-Json::Value FindIndexables(const std::string& conf_path);
+// One descriptor, read as often as it is asked for, since a package may be changed meanwhile. What
+// the file holds is parsed again only when that is not what it held the last time.
+class Descriptor {
+ public:
+  explicit Descriptor(std::string conf_path) : conf_path_(std::move(conf_path)) {}
+
+  // Reads the file and gives the array of its indexable records, those that the device filters let
+  // pass, in file order: each an object with "path", "id", "title", "desc", "keywords",
+  // "stringset" and "owner". A file that cannot be read or parsed is logged and gives none; so is a
+  // module whose id cannot be made into text. Throws only what IsPassFilter throws.
+  Json::Value FindIndexables();
+
+ private:
+  bool Read();
+
+  const std::string conf_path_;
+  std::optional<std::string> text_;  // that root_ was parsed from
+  Json::Value root_;
+};
+
+// The records of a descriptor that is read once.
+inline Json::Value FindIndexables(const std::string& conf_path) {
+  return Descriptor(conf_path).FindIndexables();
+}
 
 // Finds the first descriptor in `find_dir` (ending in "/") or up to five levels below it,
 // depth-first in the order in which the file system lists directories. `depth` is 0 at the start.

@@ -8,6 +8,8 @@
 
 namespace velkor {
 
+constexpr std::size_t kMaxJsonFileBytes = std::size_t{16} * 1024 * 1024;
+
 // Reads a whole regular file of at most `limit` bytes into `content`. Returns false, with errno set
 // and `content` untouched, for anything else: EISDIR for a directory, EINVAL for another kind of
 // file, EFBIG for a larger one. Never hangs on a FIFO.

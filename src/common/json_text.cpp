@@ -16,8 +16,6 @@ namespace {
 // 256 KiB, in builds with sanitizers too.
 constexpr int kMaxDepth = 128;
 
-constexpr std::size_t kMaxFileBytes = std::size_t{16} * 1024 * 1024;
-
 constexpr std::size_t kUsualTextBytes = 1024;  // most requests to the search daemon
 
 constexpr char kReplacementCharacter[] = "\xEF\xBF\xBD";
@@ -178,7 +176,7 @@ std::string toString(const Json::Value& value) {
 
 bool fromFile(Json::Value& value, const std::string& path) {
   std::string text;
-  return ReadRegularFile(path, kMaxFileBytes, text) && fromString(value, text);
+  return ReadRegularFile(path, kMaxJsonFileBytes, text) && fromString(value, text);
 }
 
 bool toFile(const Json::Value& value, const std::string& path, mode_t mode) {

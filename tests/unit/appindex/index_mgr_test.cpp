@@ -117,6 +117,16 @@ TEST_F(IndexAdd, ReadsTheDescriptorAgainForEachLanguage) {
   EXPECT_EQ(daemon.Commands(), expected);
 }
 
+TEST_F(IndexAdd, DescriptorEmptiedBetweenTwoLanguagesIsMalformedFromThenOn) {
+  ScriptedDaemon daemon(kSucceed);
+  Install("App");
+  test::Time().on_usleep = [](unsigned) { test::WriteFile(ConfOf("App"), ""); };
+  Add(ConfOf("App"), false);
+  test::Time().on_usleep = nullptr;
+  EXPECT_EQ(daemon.Commands(), std::vector<std::string>{"document_upsert_by_id appindex_chs App"});
+  EXPECT_EQ(TakeLog().size(), 1U + 20U);
+}
+
 TEST_F(IndexAdd, MalformedDescriptorIsLoggedForEachLanguageAndStillCommitted) {
   ScriptedDaemon daemon(kSucceed);
   test::WriteFile(ConfOf("App"), "{");
