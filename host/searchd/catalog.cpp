@@ -37,45 +37,98 @@ void Catalog::Create(IndexDefinition definition) {
   const std::lock_guard change_lock(change_mutex_);
   CheckNew(definition);
   const std::string id = definition.id;
-  const std::string path = definition.path;
   const std::string entry = RegistryEntry(definition);
-  std::vector<std::string> entries = EntriesWithout(id);
-  entries.push_back(entry);
-  auto index = std::make_shared<Index>(std::move(definition), std::make_unique<DatabaseCheck>());
-
-  PrepareIndexDirectory(path);
-  try {
-    registry_.Save(entries);
-  } catch (const RequestError&) {
-    RemoveIndexDirectory(path);
-    throw;
+  auto index = std::make_shared<Index>(definition, std::make_unique<DatabaseCheck>());
+  ReusePath(definition);
+  PrepareIndexDirectory(definition.path);
+  {
+    const std::lock_guard lock(mutex_);
+    indexes_.emplace(id, Known{std::move(index), entry});
+    settled_.insert(id);
   }
-  const std::lock_guard lock(mutex_);
-  indexes_.emplace(id, Known{std::move(index), entry});
+  MarkChanged();
 }
 
 void Catalog::Delete(const std::string& id) {
   const std::lock_guard change_lock(change_mutex_);
+  {
+    const std::lock_guard lock(mutex_);
+    if (IsLost(id)) {
+      settled_.insert(id);
+      return;
+    }
+  }
   const std::shared_ptr<Index> index = Find(id);
-  // Forgotten before its files go: a crash between the two leaves files that a new index at this
-  // path clears away, never an index without files.
-  registry_.Save(EntriesWithout(id));
   {
     const std::lock_guard lock(mutex_);
     indexes_.erase(id);
+    settled_.insert(id);
   }
   index->Close();
-  RemoveIndexDirectory(index->Definition().path);
+  deleted_.push_back(index->Definition());
+  MarkChanged();
+}
+
+void Catalog::Save() {
+  const std::lock_guard change_lock(change_mutex_);
+  SaveLocked();
+}
+
+void Catalog::SaveIfNeeded() {
+  if (!save_soon_.exchange(false)) return;
+  try {
+    Save();
+  } catch (const RequestError& e) {
+    syslog(LOG_ERR, "storage failure: %s", e.what());
+  }
+}
+
+// The files of a deleted index go last: a crash before that leaves files that a new index at this
+// path clears away, never an index without files.
+void Catalog::SaveLocked() {
+  if (!unsaved_) return;
+  registry_.Save(Entries());
+  unsaved_ = false;
+  save_soon_ = false;
+  for (const IndexDefinition& definition : deleted_) {
+    try {
+      RemoveIndexDirectory(definition.path);
+    } catch (const RequestError& e) {
+      syslog(LOG_WARNING, "files of a deleted index stay: %s", e.what());
+    }
+  }
+  deleted_.clear();
+}
+
+void Catalog::MarkChanged() {
+  unsaved_ = true;
+  save_soon_ = true;
+}
+
+// Lets an index have the directory of one that was deleted. If that was the same one, a crash may
+// leave it empty; another one has to be forgotten for good first.
+void Catalog::ReusePath(const IndexDefinition& definition) {
+  for (auto deleted = deleted_.begin(); deleted != deleted_.end(); ++deleted) {
+    if (!Overlap(deleted->path, definition.path)) continue;
+    if (deleted->path == definition.path && deleted->id == definition.id) {
+      deleted_.erase(deleted);
+    } else {
+      SaveLocked();
+    }
+    return;
+  }
 }
 
 std::shared_ptr<Index> Catalog::Find(const std::string& id) const {
   const std::lock_guard lock(mutex_);
   const auto found = indexes_.find(id);
   if (found != indexes_.end()) return found->second.index;
-  std::string message = "no such index: " + id;
-  if (!registry_damage_.empty())
-    message += " (a damaged registry was set aside: " + registry_damage_ + ")";
-  throw RequestError(Code::kNoSuchIndex, message);
+  if (IsLost(id)) {
+    throw RequestError(Code::kStorage,
+                       "nothing is known of index " + id +
+                           ", the registry was damaged and set aside: " + registry_damage_);
+  }
+  throw RequestError(Code::kNoSuchIndex, "no such index: " + id);
 }
 
 std::vector<std::shared_ptr<Index>> Catalog::All() const {
@@ -113,13 +166,16 @@ void Catalog::CheckNew(const IndexDefinition& definition) const {
   }
 }
 
-std::vector<std::string> Catalog::EntriesWithout(const std::string& id) const {
+std::vector<std::string> Catalog::Entries() const {
   const std::lock_guard lock(mutex_);
   std::vector<std::string> entries;
-  for (const auto& [other, known] : indexes_) {
-    if (other != id) entries.push_back(known.entry);
-  }
+  for (const auto& [id, known] : indexes_) entries.push_back(known.entry);
   return entries;
+}
+
+// Whether an index that is not known may have been in a registry that was set aside.
+bool Catalog::IsLost(const std::string& id) const {
+  return !registry_damage_.empty() && indexes_.count(id) == 0 && settled_.count(id) == 0;
 }
 
 }  // namespace searchd

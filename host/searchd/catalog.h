@@ -1,9 +1,12 @@
-// The indexes of the daemon: the registry and the open indexes, kept in step.
+// The indexes of the daemon. What is created and deleted holds at once; the registry file, which
+// says what there is after a restart, follows with Save.
 #pragma once
 
+#include <atomic>
 #include <map>
 #include <memory>
 #include <mutex>
+#include <set>
 #include <string>
 #include <vector>
 
@@ -24,8 +27,15 @@ class Catalog {
 
   void Create(IndexDefinition definition);
 
-  // Also deletes a damaged index.
+  // Also deletes a damaged index. Its files go with Save, so that a crash before leaves it whole.
   void Delete(const std::string& id);
+
+  // Makes what was created and deleted durable.
+  void Save();
+
+  // Whether Save would find something new to do. SaveIfNeeded tries once, and logs a failure.
+  bool NeedsSave() const { return save_soon_; }
+  void SaveIfNeeded();
 
   std::shared_ptr<Index> Find(const std::string& id) const;
 
@@ -42,14 +52,23 @@ class Catalog {
   };
 
   void CheckNew(const IndexDefinition& definition) const;
-  std::vector<std::string> EntriesWithout(const std::string& id) const;
+  void ReusePath(const IndexDefinition& definition);
+  void MarkChanged();
+  void SaveLocked();
+  std::vector<std::string> Entries() const;
+  bool IsLost(const std::string& id) const;
 
   const Registry registry_;
-  std::string registry_damage_;
+  std::string registry_damage_;  // what was wrong with a registry that was set aside
 
-  std::mutex change_mutex_;   // held while the registry file changes; taken before mutex_
-  mutable std::mutex mutex_;  // guards indexes_
+  std::mutex change_mutex_;  // held by whatever changes which indexes there are; taken first
+  bool unsaved_ = false;
+  std::vector<IndexDefinition> deleted_;  // whose files are still there
+  std::atomic<bool> save_soon_ = false;
+
+  mutable std::mutex mutex_;  // guards what follows
   std::map<std::string, Known> indexes_;
+  std::set<std::string> settled_;  // created or deleted since the registry was set aside
 };
 
 }  // namespace searchd

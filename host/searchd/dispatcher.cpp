@@ -90,9 +90,12 @@ std::string Dispatcher::TooLong() {
                                           std::to_string(host::kMaxFrameBytes) + " bytes");
 }
 
-bool Dispatcher::HasIdleWork() { return catalog_.FindWithWork() != nullptr; }
+bool Dispatcher::HasIdleWork() {
+  return catalog_.NeedsSave() || catalog_.FindWithWork() != nullptr;
+}
 
 void Dispatcher::DoIdleWork() {
+  catalog_.SaveIfNeeded();
   if (const auto index = catalog_.FindWithWork()) index->DoWork();
 }
 
@@ -169,7 +172,9 @@ Json::Value Dispatcher::DeleteDocument(Request& request) {
 }
 
 Json::Value Dispatcher::Commit(Request& request) {
-  catalog_.Find(RequiredString(request.data, "id"))->Commit();
+  const auto index = catalog_.Find(RequiredString(request.data, "id"));
+  catalog_.Save();
+  index->Commit();
   return Nothing();
 }
 

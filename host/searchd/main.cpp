@@ -48,6 +48,7 @@ void Serve(const Options& options, Started started) {
   syslog(LOG_NOTICE, "started, %zu indexes", catalog.All().size());
   started();
   server.Run(kWorkers);
+  catalog.Save();
   syslog(LOG_NOTICE, "stopped");
 }
 
