@@ -3,6 +3,7 @@
 
 #include <unicode/brkiter.h>
 #include <unicode/coll.h>
+#include <xapian.h>
 
 #include <memory>
 #include <string>
@@ -13,10 +14,12 @@
 
 namespace searchd {
 
-// A word in its folded form and in the form without accents; the two are often equal.
+// A word or a text in its folded form, in the form without accents, and in that without any marks.
+// The three are often equal.
 struct Word {
   std::string raw;
   std::string plain;
+  std::string bare;
 };
 
 // Holds break iterators, which remember a text: one thread at a time.
@@ -27,30 +30,55 @@ class Analyzer {
   // The words of a text under a field's rule, before a step "ngram", in the order of the text.
   std::vector<Word> Words(const FieldRule& rule, const std::string& text);
 
-  // A whole text as one folded, accent-free word with single spaces, to compare titles with.
-  std::string WholeText(const std::string& text) const;
+  // The stems of a word, without accents; none where the language has no stemmer.
+  std::vector<std::string> Stems(const Word& word) const;
+
+  // A whole text as one folded word with single spaces, to compare titles with.
+  Word WholeText(const std::string& text) const;
+
+  // A whole text without accents, spaces and punctuation.
+  std::string Skeleton(const std::string& text) const;
 
   // Bytes that order texts as the language's dictionaries do.
-  std::string SortKey(const std::string& text) const;
+  std::string SortKey(const std::string& text);
 
  private:
   std::vector<Word> StandardWords(const icu::UnicodeString& folded);
   std::vector<Word> WhiteSpaceWords(const icu::UnicodeString& text, bool folded) const;
 
   Language language_;
+  Xapian::Stem stem_;
   std::unique_ptr<icu::BreakIterator> breaks_;
-  std::unique_ptr<icu::Collator> collator_;
+  std::unique_ptr<icu::Collator> collator_;  // made when first needed
 };
 
-// The n-grams that a word is indexed by: all its parts of up to three characters. Single
-// characters only of scripts in which one says something.
-std::vector<std::string> IndexGrams(const std::string& word);
+// How many characters a text of UTF-8 has.
+std::size_t CountCharacters(const std::string& text);
 
-// The n-grams that together stand for a typed part of a word: itself up to three characters, its
-// parts of three beyond. Each is among IndexGrams of any word that contains the part.
-std::vector<std::string> QueryGrams(const std::string& part);
+// What a text begins with, up to three characters: what is typed first is looked up as a term, and
+// not in all the terms that begin so.
+constexpr std::size_t kMaxBeginning = 3;
+std::vector<std::string> Beginnings(const std::string& text);
+
+// The n-grams of a word: for each of its characters, what begins with it, `least` to `most`
+// characters.
+std::vector<std::string> Grams(const std::string& word, std::size_t least, std::size_t most);
+
+// The characters of a word of which one alone says something.
+std::vector<std::string> DenseCharacters(const std::string& word);
+
+// Those n-grams of a word that together stand for a typed part of it, of `least` characters or
+// more. One that is shorter than `most` is the beginning of an n-gram.
+std::vector<std::string> QueryGrams(const std::string& part, std::size_t most);
+
+// What stands behind an apostrophe that joins a short word to the next, as in "l'album"; empty for
+// any other word, such as "anna's".
+std::string BehindApostrophe(const std::string& word);
 
 // The parts of a text that white space separates.
 std::vector<std::string> SplitWhiteSpace(const std::string& text);
+
+// The longest parts of a folded text that are in a script without spaces.
+std::vector<std::string> DenseRuns(const std::string& folded);
 
 }  // namespace searchd

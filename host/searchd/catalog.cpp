@@ -19,12 +19,13 @@ bool Overlap(const std::string& a, const std::string& b) {
 
 }  // namespace
 
-Catalog::Catalog(const std::string& registry_file) : registry_(registry_file) {
+Catalog::Catalog(const std::string& registry_file, CheckProcess& checks)
+    : registry_(registry_file), checks_(checks) {
   for (IndexDefinition& definition : registry_.Load(registry_damage_)) {
     const std::string id = definition.id;
     const std::string entry = RegistryEntry(definition);
-    auto check = DatabaseCheck::Start(definition.path);
-    auto index = std::make_shared<Index>(std::move(definition), std::move(check));
+    auto index =
+        std::make_shared<Index>(std::move(definition), checks_, DatabaseCheck::Files::kFound);
     indexes_.emplace(id, Known{std::move(index), entry});
   }
   if (!registry_damage_.empty()) {
@@ -33,14 +34,14 @@ Catalog::Catalog(const std::string& registry_file) : registry_(registry_file) {
   }
 }
 
-void Catalog::Create(IndexDefinition definition) {
+void Catalog::Create(const IndexDefinition& definition) {
   const std::lock_guard change_lock(change_mutex_);
   CheckNew(definition);
   const std::string id = definition.id;
   const std::string entry = RegistryEntry(definition);
-  auto index = std::make_shared<Index>(definition, std::make_unique<DatabaseCheck>());
-  ReusePath(definition);
-  PrepareIndexDirectory(definition.path);
+  auto index = std::make_shared<Index>(definition, checks_, DatabaseCheck::Files::kMade);
+  const bool known = ReusePath(definition);
+  PrepareIndexDirectory(definition.path, known);
   {
     const std::lock_guard lock(mutex_);
     indexes_.emplace(id, Known{std::move(index), entry});
@@ -106,17 +107,23 @@ void Catalog::MarkChanged() {
 }
 
 // Lets an index have the directory of one that was deleted. If that was the same one, a crash may
-// leave it empty; another one has to be forgotten for good first.
-void Catalog::ReusePath(const IndexDefinition& definition) {
+// leave it empty; another one has to be forgotten for good first. Returns whether it was that one,
+// whose files are still there.
+bool Catalog::ReusePath(const IndexDefinition& definition) {
   for (auto deleted = deleted_.begin(); deleted != deleted_.end(); ++deleted) {
     if (!Overlap(deleted->path, definition.path)) continue;
     if (deleted->path == definition.path && deleted->id == definition.id) {
       deleted_.erase(deleted);
-    } else {
-      SaveLocked();
+      return true;
     }
-    return;
+    SaveLocked();
+    break;
   }
+  return false;
+}
+
+void Catalog::Reopen() {
+  for (const auto& index : All()) index->Reopen();
 }
 
 std::shared_ptr<Index> Catalog::Find(const std::string& id) const {
@@ -124,9 +131,8 @@ std::shared_ptr<Index> Catalog::Find(const std::string& id) const {
   const auto found = indexes_.find(id);
   if (found != indexes_.end()) return found->second.index;
   if (IsLost(id)) {
-    throw RequestError(Code::kStorage,
-                       "nothing is known of index " + id +
-                           ", the registry was damaged and set aside: " + registry_damage_);
+    throw KnownDamage("nothing is known of index " + id +
+                      ", the registry was damaged and set aside: " + registry_damage_);
   }
   throw RequestError(Code::kNoSuchIndex, "no such index: " + id);
 }

@@ -22,10 +22,10 @@ constexpr std::size_t kMaxIndexIdBytes = 200;
 class Catalog {
  public:
   // Loads the registry and starts to check the indexes. A damaged one is known all the same, and
-  // fails when it is used. To be made before any thread is started.
-  explicit Catalog(const std::string& registry_file);
+  // fails when it is used.
+  Catalog(const std::string& registry_file, CheckProcess& checks);
 
-  void Create(IndexDefinition definition);
+  void Create(const IndexDefinition& definition);
 
   // Also deletes a damaged index. Its files go with Save, so that a crash before leaves it whole.
   void Delete(const std::string& id);
@@ -36,6 +36,9 @@ class Catalog {
   // Whether Save would find something new to do. SaveIfNeeded tries once, and logs a failure.
   bool NeedsSave() const { return save_soon_; }
   void SaveIfNeeded();
+
+  // Has every index let go of its files, and checks them before they are opened again.
+  void Reopen();
 
   std::shared_ptr<Index> Find(const std::string& id) const;
 
@@ -52,13 +55,14 @@ class Catalog {
   };
 
   void CheckNew(const IndexDefinition& definition) const;
-  void ReusePath(const IndexDefinition& definition);
+  bool ReusePath(const IndexDefinition& definition);
   void MarkChanged();
   void SaveLocked();
   std::vector<std::string> Entries() const;
   bool IsLost(const std::string& id) const;
 
   const Registry registry_;
+  CheckProcess& checks_;
   std::string registry_damage_;  // what was wrong with a registry that was set aside
 
   std::mutex change_mutex_;  // held by whatever changes which indexes there are; taken first

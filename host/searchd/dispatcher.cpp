@@ -10,6 +10,7 @@
 #include "host/searchd/json_text.h"
 #include "host/searchd/permission.h"
 #include "host/searchd/request_error.h"
+#include "host/searchd/system_log.h"
 
 namespace searchd {
 namespace {
@@ -29,11 +30,9 @@ std::string FailureText(Code code, const std::string& message) {
   return JsonText(reply);
 }
 
-// Most replies say nothing more.
-std::string SuccessText(Json::Value reply) {
-  if (reply.empty()) return R"({"success":true})";
-  reply["success"] = true;
-  return JsonText(reply);
+// `members` is the text of what the reply says beside its success.
+std::string SuccessText(const std::string& members) {
+  return R"({"success":true)" + (members.empty() ? "" : "," + members) + "}";
 }
 
 std::string RequiredString(const Json::Value& data, const char* member) {
@@ -54,12 +53,20 @@ unsigned OptionalNumber(const Json::Value& data, const char* member, unsigned ab
   return value.asUInt();
 }
 
+bool OptionalFlag(const Json::Value& data, const char* member) {
+  if (!data.isMember(member)) return false;
+  if (!data[member].isBool()) {
+    throw RequestError(Code::kRejected, std::string("\"") + member + "\" must be true or false");
+  }
+  return data[member].asBool();
+}
+
 void CheckSettings(const Json::Value& settings) {
   if (settings.isNull() || (settings.isObject() && settings.empty())) return;
   throw RequestError(Code::kRejected, "\"settings\" must be an empty object");
 }
 
-Json::Value Nothing() { return Json::Value(Json::objectValue); }
+Json::Value EmptyObject() { return Json::Value(Json::objectValue); }
 
 }  // namespace
 
@@ -75,6 +82,8 @@ Answer Dispatcher::Handle(const std::string& request, uid_t client) {
     if (answer.text.size() > host::kMaxFrameBytes) {
       throw RequestError(Code::kRejected, "the reply would be too long: ask for fewer hits");
     }
+  } catch (const KnownDamage& e) {
+    answer.text = FailureText(e.GetCode(), e.what());
   } catch (const RequestError& e) {
     if (e.GetCode() == Code::kStorage) syslog(LOG_ERR, "storage failure: %s", e.what());
     answer.text = FailureText(e.GetCode(), e.what());
@@ -88,6 +97,12 @@ Answer Dispatcher::Handle(const std::string& request, uid_t client) {
 std::string Dispatcher::TooLong() {
   return FailureText(Code::kRejected, "the request is longer than " +
                                           std::to_string(host::kMaxFrameBytes) + " bytes");
+}
+
+void Dispatcher::Reopen() {
+  ReopenSystemLog();
+  catalog_.Reopen();
+  syslog(LOG_NOTICE, "reopened, %zu indexes", catalog_.All().size());
 }
 
 bool Dispatcher::HasIdleWork() {
@@ -111,12 +126,13 @@ const Dispatcher::Command& Dispatcher::FindCommand(const std::string& name) {
   };
   const auto found = commands.find(name);
   if (found == commands.end()) {
-    throw RequestError(Code::kUnknownCommand, "unknown command: " + name.substr(0, 100));
+    throw RequestError(Code::kUnknownCommand,
+                       "unknown command: " + (name.size() <= 100 ? name : "a very long one"));
   }
   return found->second;
 }
 
-Json::Value Dispatcher::Run(const std::string& text, uid_t client, std::function<void()>& after) {
+std::string Dispatcher::Run(const std::string& text, uid_t client, std::function<void()>& after) {
   Json::Value request = ParseJson(text);
   if (!request.isObject()) throw RequestError(Code::kRejected, "the request must be an object");
   const std::string name = RequiredString(request, "command");
@@ -126,11 +142,11 @@ Json::Value Dispatcher::Run(const std::string& text, uid_t client, std::function
                        "user " + std::to_string(client) + " may not use " + name);
   }
   Json::Value& data = request["data"];
-  if (data.isNull()) data = Nothing();
+  if (data.isNull()) data = EmptyObject();
   if (!data.isObject()) throw RequestError(Code::kRejected, "\"data\" must be an object");
 
   Request arguments{std::move(data), text.size(), nullptr};
-  Json::Value reply = (this->*command.run)(arguments);
+  std::string reply = (this->*command.run)(arguments);
   after = std::move(arguments.after);
   return reply;
 }
@@ -139,64 +155,64 @@ void Dispatcher::ApplyAfterReply(Request& request, const std::shared_ptr<Index>&
   request.after = [index] { index->ApplyChanges(); };
 }
 
-Json::Value Dispatcher::Create(Request& request) {
+std::string Dispatcher::Create(Request& request) {
   const Json::Value& data = request.data;
   const std::string id = RequiredString(data, "id");
   const std::string path = CheckedIndexPath(RequiredString(data, "path"));
   CheckSettings(data["settings"]);
   catalog_.Create({id, path, data["mappings"]});
   syslog(LOG_NOTICE, "index created: %s in %s", id.c_str(), path.c_str());
-  return Nothing();
+  return {};
 }
 
-Json::Value Dispatcher::Delete(Request& request) {
+std::string Dispatcher::Delete(Request& request) {
   const std::string id = RequiredString(request.data, "id");
   catalog_.Delete(id);
   syslog(LOG_NOTICE, "index deleted: %s", id.c_str());
-  return Nothing();
+  return {};
 }
 
-Json::Value Dispatcher::Upsert(Request& request) {
+std::string Dispatcher::Upsert(Request& request) {
   const auto index = catalog_.Find(RequiredString(request.data, "id"));
   const std::string document_id = RequiredString(request.data, "doc_id");
   if (index->Upsert(document_id, std::move(request.data["data"]), request.bytes)) {
     ApplyAfterReply(request, index);
   }
-  return Nothing();
+  return {};
 }
 
-Json::Value Dispatcher::DeleteDocument(Request& request) {
+std::string Dispatcher::DeleteDocument(Request& request) {
   const auto index = catalog_.Find(RequiredString(request.data, "id"));
   if (index->Delete(RequiredString(request.data, "doc_id"))) ApplyAfterReply(request, index);
-  return Nothing();
+  return {};
 }
 
-Json::Value Dispatcher::Commit(Request& request) {
+std::string Dispatcher::Commit(Request& request) {
   const auto index = catalog_.Find(RequiredString(request.data, "id"));
   catalog_.Save();
   index->Commit();
-  return Nothing();
+  return {};
 }
 
-Json::Value Dispatcher::Search(Request& request) {
+std::string Dispatcher::Search(Request& request) {
   const Json::Value& data = request.data;
   const auto index = catalog_.Find(RequiredString(data, "id"));
-  const std::string query = RequiredString(data, "query");
-  const unsigned offset = OptionalNumber(data, "offset", 0, kMaxOffset);
-  const unsigned limit = OptionalNumber(data, "limit", kDefaultLimit, kMaxLimit);
-  SearchResult result = index->Search(query, offset, limit);
-  Json::Value reply = Nothing();
-  reply["total"] = result.total;
-  reply["hits"] = std::move(result.hits);
-  if (result.cut) reply["cut"] = true;
-  return reply;
+  SearchRequest search;
+  search.query = RequiredString(data, "query");
+  search.offset = OptionalNumber(data, "offset", 0, kMaxOffset);
+  search.limit = OptionalNumber(data, "limit", kDefaultLimit, kMaxLimit);
+  search.explain = OptionalFlag(data, "explain");
+  const SearchResult result = index->Search(search);
+  std::string reply = "\"total\":" + std::to_string(result.total);
+  if (!result.matched.empty()) reply += ",\"matched\":\"" + result.matched + '"';
+  if (result.cut) reply += ",\"cut\":true";
+  return reply + ",\"hits\":" + result.hits;
 }
 
-Json::Value Dispatcher::List(Request&) {
-  Json::Value reply = Nothing();
-  Json::Value& indexes = reply["indexes"] = Json::Value(Json::arrayValue);
+std::string Dispatcher::List(Request&) {
+  Json::Value indexes(Json::arrayValue);
   for (const auto& index : catalog_.All()) {
-    Json::Value entry = Nothing();
+    Json::Value entry = EmptyObject();
     entry["id"] = index->Definition().id;
     entry["path"] = index->Definition().path;
     try {
@@ -206,7 +222,7 @@ Json::Value Dispatcher::List(Request&) {
     }
     indexes.append(std::move(entry));
   }
-  return reply;
+  return "\"indexes\":" + JsonText(indexes);
 }
 
 }  // namespace searchd

@@ -17,6 +17,7 @@ class Dispatcher : public Handler {
   bool IsQuick(const std::string& request) override;
   Answer Handle(const std::string& request, uid_t client) override;
   std::string TooLong() override;
+  void Reopen() override;
   bool HasIdleWork() override;
   void DoIdleWork() override;
 
@@ -26,22 +27,23 @@ class Dispatcher : public Handler {
     std::size_t bytes = 0;
     std::function<void()> after;
   };
+  // Returns the text of the members that the reply has beside "success".
   struct Command {
     bool changes;
-    Json::Value (Dispatcher::*run)(Request&);
+    std::string (Dispatcher::*run)(Request&);
   };
 
   static const Command& FindCommand(const std::string& name);
-  Json::Value Run(const std::string& text, uid_t client, std::function<void()>& after);
+  std::string Run(const std::string& text, uid_t client, std::function<void()>& after);
   void ApplyAfterReply(Request& request, const std::shared_ptr<Index>& index);
 
-  Json::Value Create(Request& request);
-  Json::Value Delete(Request& request);
-  Json::Value Upsert(Request& request);
-  Json::Value DeleteDocument(Request& request);
-  Json::Value Commit(Request& request);
-  Json::Value Search(Request& request);
-  Json::Value List(Request& request);
+  std::string Create(Request& request);
+  std::string Delete(Request& request);
+  std::string Upsert(Request& request);
+  std::string DeleteDocument(Request& request);
+  std::string Commit(Request& request);
+  std::string Search(Request& request);
+  std::string List(Request& request);
 
   Catalog& catalog_;
 };

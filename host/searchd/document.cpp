@@ -1,7 +1,5 @@
 #include "host/searchd/document.h"
 
-#include <set>
-
 #include "host/searchd/json_text.h"
 #include "host/searchd/ranking.h"
 #include "host/searchd/request_error.h"
@@ -14,48 +12,125 @@ namespace {
   throw RequestError(Code::kRejected, "document member \"" + member + "\" " + cause);
 }
 
-// Adds the terms of one document, member by member.
+// How many of the first words of the keywords may be an application's name.
+constexpr std::size_t kMaxNameWords = 6;
+
+// Adds the terms of one document, member by member. Only how often a keyword stands there counts:
+// repeating a word elsewhere says nothing.
 class TermAdder {
  public:
   TermAdder(Xapian::Document& document, Analyzer& analyzer)
       : document_(document), analyzer_(analyzer) {}
 
-  void AddMember(const std::string& name, bool named, const FieldRule& rule,
+  void AddMember(const std::string& member, const FieldRule& rule, const std::string& name,
                  const std::string& text) {
-    const std::string prefix = named ? FieldPrefix(name) : UnnamedFieldsPrefix();
+    const std::vector<Word> words = analyzer_.Words(rule, text);
     const Role role = RoleOf(name, rule);
-    for (const Word& word : analyzer_.Words(rule, text)) {
-      if (rule.ngram) {
-        for (const std::string& gram : IndexGrams(word.plain)) AddOnce(WordTerm(prefix, gram));
-        continue;
-      }
-      AddWord(prefix, word.raw, role);
-      if (word.plain != word.raw) AddWord(prefix, word.plain, role);
+    if (rule.ngram) {
+      for (const Word& word : words) AddGrams(member, role, word.raw, word.plain);
+      return;
     }
-    if (role == Role::kTitle && rule.in_all) {
-      AddOnce(WholeTitleTerm(analyzer_.WholeText(text)));
+    for (const Word& word : words) {
+      AddWord(member, role, word);
+      const std::string behind = BehindApostrophe(word.raw);
+      if (behind.empty() || rule.analyzer != AnalyzerKind::kStandard) continue;
+      for (const Word& other : analyzer_.Words(rule, behind)) AddWord(member, role, other);
     }
+    if (rule.analyzer == AnalyzerKind::kStandard) AddStandard(member, role, words, text);
+    if (!rule.in_all) return;
+    if (role == Role::kTitle) AddTitle(text);
+    if (role == Role::kKeywords) AddName(text);
   }
 
  private:
-  // Repeating a keyword makes it weigh more; repeating a word elsewhere says nothing.
-  void AddWord(const std::string& prefix, const std::string& word, Role role) {
-    const std::string term = WordTerm(prefix, word);
-    if (role == Role::kKeywords) {
-      document_.add_term(term);
-    } else {
-      AddOnce(term);
+  void AddWord(const std::string& member, Role role, const Word& word) {
+    const Xapian::termcount count = role == Role::kKeywords ? 1 : 0;
+    const auto add = [&](Space space, const std::string& form) {
+      document_.add_term(WordTerm(FieldPrefix(member, space), form), count);
+    };
+    add(Space::kWords, word.raw);
+    for (const std::string& beginning : Beginnings(word.raw)) add(Space::kBeginnings, beginning);
+    if (word.bare != word.plain) add(Space::kBareWords, word.bare);
+    if (word.plain == word.raw) return;
+    add(Space::kPlainWords, word.plain);
+    for (const std::string& beginning : Beginnings(word.plain)) {
+      add(Space::kPlainBeginnings, beginning);
     }
   }
 
-  void AddOnce(const std::string& term) {
-    if (added_.insert(term).second) document_.add_term(term);
+  void AddStandard(const std::string& member, Role role, const std::vector<Word>& words,
+                   const std::string& text) {
+    for (std::size_t i = 0; i < words.size(); ++i) {
+      for (const std::string& stem : analyzer_.Stems(words[i])) {
+        Add(FieldPrefix(member, Space::kStems), stem);
+      }
+      if (i == 0 || PhraseWorth(role) == 0) continue;
+      Add(FieldPrefix(member, Space::kPairs), Pair(words[i - 1].plain, words[i].plain));
+    }
+    const Word whole = analyzer_.WholeText(text);
+    const std::vector<std::string> runs = DenseRuns(whole.raw);
+    const std::vector<std::string> plain_runs = DenseRuns(whole.plain);
+    for (std::size_t i = 0; i < runs.size(); ++i) AddGrams(member, role, runs[i], plain_runs[i]);
+  }
+
+  void AddGrams(const std::string& member, Role role, const std::string& raw,
+                const std::string& plain) {
+    AddGrams(member, role, raw, Space::kGrams, Space::kLongGrams);
+    if (plain != raw) AddGrams(member, role, plain, Space::kPlainGrams, Space::kPlainLongGrams);
+  }
+
+  void AddGrams(const std::string& member, Role role, const std::string& word, Space space,
+                Space long_space) {
+    const auto add = [&](Space where, const std::vector<std::string>& grams) {
+      for (const std::string& gram : grams) Add(FieldPrefix(member, where), gram);
+    };
+    if (!IsFoundByParts(role)) {
+      add(space, Grams(word, kShortGram, kTextGram));
+      return;
+    }
+    add(space, DenseCharacters(word));
+    add(space, Grams(word, kShortGram, kShortGram));
+    add(long_space, Grams(word, kShortGram + 1, kLongGram));
+  }
+
+  void AddTitle(const std::string& text) {
+    const Word whole = analyzer_.WholeText(text);
+    AddWhole(kTitlePrefix, kTitleBeginningPrefix, whole.raw);
+    if (whole.plain != whole.raw) {
+      AddWhole(kPlainTitlePrefix, kPlainTitleBeginningPrefix, whole.plain);
+    }
+    if (whole.bare != whole.plain) Add(kBareTitlePrefix, whole.bare);
+    Add(kSkeletonPrefix, analyzer_.Skeleton(text));
+  }
+
+  void AddName(const std::string& text) {
+    std::string name;
+    std::size_t words = 0;
+    for (const std::string& part : SplitWhiteSpace(text)) {
+      if (++words > kMaxNameWords) return;
+      name += part + ' ';
+      AddWhole(kNamePrefix, kNameBeginningPrefix, analyzer_.WholeText(name).plain);
+    }
+  }
+
+  void AddWhole(const std::string& prefix, const std::string& beginning_prefix,
+                const std::string& text) {
+    Add(prefix, text);
+    for (const std::string& beginning : Beginnings(text)) Add(beginning_prefix, beginning);
+  }
+
+  void Add(const std::string& prefix, const std::string& word) {
+    document_.add_boolean_term(WordTerm(prefix, word));
   }
 
   Xapian::Document& document_;
   Analyzer& analyzer_;
-  std::set<std::string> added_;
 };
+
+// A part of an application names it as its owner.
+bool IsApplication(const Mapping& mapping, const Json::Value& data) {
+  return mapping.Fields().count("owner") != 0 && data.get("owner", "").asString().empty();
+}
 
 }  // namespace
 
@@ -94,9 +169,11 @@ Xapian::Document BuildDocument(const Mapping& mapping, Analyzer& analyzer,
   for (auto it = data.begin(); it != data.end(); ++it) {
     const std::string name = it.name();
     const FieldRule& rule = mapping.RuleOf(name);
-    adder.AddMember(name, mapping.Fields().count(name) != 0, rule, it->asString());
-    if (rule.stored) stored[name] = *it;
+    const bool named = mapping.Fields().count(name) != 0;
+    adder.AddMember(named ? name : "", rule, name, it->asString());
+    if (rule.stored && IsShownInHits(name)) stored[name] = *it;
   }
+  if (IsApplication(mapping, data)) document.add_boolean_term(kApplicationTerm);
   document.set_data(JsonText(stored));
   document.add_value(kOrderSlot, analyzer.SortKey(data.get("title", "").asString()) + document_id);
   return document;

@@ -2,6 +2,7 @@
 
 #include <unicode/normalizer2.h>
 #include <unicode/uchar.h>
+#include <unicode/uscript.h>
 
 #include <stdexcept>
 
@@ -67,6 +68,18 @@ UChar32 AsHiragana(UChar32 c) {
   return c >= kFirstKatakana && c <= kLastKatakana ? c - kDistance : c;
 }
 
+constexpr UChar32 kProlongedSound = 0x30FC;
+
+// The vowel that a hiragana ends in, as a hiragana; 0 for what has none.
+UChar32 VowelOf(UChar32 c) {
+  constexpr UChar32 kFirst = 0x3041;
+  constexpr char16_t kVowels[] =
+      u"ああいいううええおおああいいううええおおああいいううええおおああいいうううええおお"
+      u"あいうえおあああいいいうううえええおおおあいうえおああううおおあいうえおああいえお";
+  constexpr UChar32 kCount = sizeof(kVowels) / sizeof(kVowels[0]) - 1;
+  return c >= kFirst && c < kFirst + kCount ? kVowels[c - kFirst] : 0;
+}
+
 }  // namespace
 
 void LoadFolding() {
@@ -76,6 +89,9 @@ void LoadFolding() {
 UnicodeString Fold(const UnicodeString& text, bool turkic) {
   UnicodeString folded = text;
   folded.findAndReplace(UnicodeString(static_cast<UChar32>(0x200B)), UnicodeString(u' '));
+  for (const UChar32 apostrophe : {0x2018, 0x2019, 0x02BC}) {
+    folded.findAndReplace(UnicodeString(apostrophe), UnicodeString(u'\''));
+  }
   if (turkic) {
     folded = Normalize(Nfc, folded);
     folded.foldCase(U_FOLD_CASE_EXCLUDE_SPECIAL_I);
@@ -97,6 +113,39 @@ UnicodeString WithoutAccents(const UnicodeString& folded) {
     }
   }
   return Normalize(Nfc, plain);
+}
+
+UnicodeString WithoutMarks(const UnicodeString& plain) {
+  if (IsAscii(plain)) return plain;
+  const UnicodeString parts = Normalize(Nfd, plain);
+  UnicodeString bare;
+  for (int32_t i = 0; i < parts.length(); i = parts.moveIndex32(i, 1)) {
+    const UChar32 c = parts.char32At(i);
+    const UChar32 vowel = c == kProlongedSound && i > 0 ? VowelOf(bare[bare.length() - 1]) : 0;
+    if (u_charType(c) != U_NON_SPACING_MARK) bare.append(vowel != 0 ? vowel : c);
+  }
+  return Normalize(Nfc, bare);
+}
+
+bool IsDense(UChar32 c) {
+  constexpr UChar32 kFirst = 0x0E00;  // Thai, the first such script
+  if (c < kFirst) return false;
+  if (c == kProlongedSound) return true;
+  UErrorCode status = U_ZERO_ERROR;
+  switch (uscript_getScript(c, &status)) {
+    case USCRIPT_BOPOMOFO:
+    case USCRIPT_HAN:
+    case USCRIPT_HANGUL:
+    case USCRIPT_HIRAGANA:
+    case USCRIPT_KATAKANA:
+    case USCRIPT_KHMER:
+    case USCRIPT_LAO:
+    case USCRIPT_MYANMAR:
+    case USCRIPT_THAI:
+      return true;
+    default:
+      return false;
+  }
 }
 
 std::string ToUtf8(const UnicodeString& text) {

@@ -27,6 +27,9 @@ class Handler {
   // The reply to a request that is longer than a frame may be.
   virtual std::string TooLong() = 0;
 
+  // Lets go of the files that it holds, and opens them again when they are needed.
+  virtual void Reopen() = 0;
+
   // Whether there is something to do when no request comes for a moment, and doing a part of it.
   virtual bool HasIdleWork() = 0;
   virtual void DoIdleWork() = 0;

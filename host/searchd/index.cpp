@@ -7,12 +7,11 @@
 
 namespace searchd {
 
-Index::Index(IndexDefinition definition, std::unique_ptr<DatabaseCheck> check)
+Index::Index(IndexDefinition definition, CheckProcess& process, DatabaseCheck::Files files)
     : definition_(std::move(definition)),
       mapping_(Mapping::Parse(definition_.mappings)),
-      check_(std::move(check)),
-      writer_(definition_.path, mapping_, LanguageOfIndex(definition_.id), *check_),
-      reader_(definition_.path, mapping_, LanguageOfIndex(definition_.id), *check_) {}
+      check_(definition_.path, process, files),
+      writer_(definition_.path, mapping_, LanguageOfIndex(definition_.id), check_) {}
 
 bool Index::Upsert(const std::string& document_id, Json::Value document, std::size_t bytes) {
   CheckDocument(mapping_, document_id, document);
@@ -24,23 +23,26 @@ bool Index::Delete(const std::string& document_id) { return Writer().Queue({docu
 void Index::ApplyChanges() { writer_.ApplyQueued(); }
 
 void Index::Commit() {
-  if (Writer().Commit()) reader_.Refresh();
+  if (!Writer().Commit()) return;
+  const std::lock_guard lock(reader_mutex_);
+  if (reader_) reader_->Refresh();
 }
 
 bool Index::HasWork() const { return writer_.HasWork(); }
 
 void Index::DoWork() { writer_.DoWork(); }
 
-SearchResult Index::Search(const std::string& query, unsigned offset, unsigned limit) {
-  return Reader().Search(query, offset, limit);
-}
+SearchResult Index::Search(const SearchRequest& request) { return Reader()->Search(request); }
 
-Xapian::doccount Index::DocumentCount() { return Reader().DocumentCount(); }
+Xapian::doccount Index::DocumentCount() { return Reader()->DocumentCount(); }
+
+void Index::Reopen() { writer_.Reopen(); }
 
 void Index::Close() {
   closed_ = true;
   writer_.Close();
-  reader_.Close();
+  const std::lock_guard lock(reader_mutex_);
+  if (reader_) reader_->Close();
 }
 
 IndexWriter& Index::Writer() {
@@ -48,8 +50,15 @@ IndexWriter& Index::Writer() {
   return writer_;
 }
 
-IndexReader& Index::Reader() {
+// A reader of its own for each time that the files have to be opened again.
+std::shared_ptr<IndexReader> Index::Reader() {
   CheckOpen();
+  const unsigned generation = check_.Await();
+  const std::lock_guard lock(reader_mutex_);
+  if (!reader_ || std::exchange(reader_generation_, generation) != generation) {
+    reader_ = std::make_shared<IndexReader>(definition_.path, mapping_,
+                                            LanguageOfIndex(definition_.id), check_);
+  }
   return reader_;
 }
 

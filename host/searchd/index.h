@@ -5,6 +5,7 @@
 
 #include <atomic>
 #include <memory>
+#include <mutex>
 #include <string>
 
 #include "host/searchd/database_check.h"
@@ -26,8 +27,8 @@ struct IndexDefinition {
 // RequestError(kNoSuchIndex).
 class Index {
  public:
-  // `check` is that of the files which the index has already.
-  Index(IndexDefinition definition, std::unique_ptr<DatabaseCheck> check);
+  // `process` must outlive the object.
+  Index(IndexDefinition definition, CheckProcess& process, DatabaseCheck::Files files);
 
   const IndexDefinition& Definition() const { return definition_; }
 
@@ -43,8 +44,12 @@ class Index {
   bool HasWork() const;
   void DoWork();
 
-  SearchResult Search(const std::string& query, unsigned offset, unsigned limit);
+  SearchResult Search(const SearchRequest& request);
   Xapian::doccount DocumentCount();
+
+  // Lets go of the files and has them checked before they are opened again. What was not committed
+  // is kept, unless somebody else has changed the files.
+  void Reopen();
 
   // Drops what was not committed and lets go of the files.
   void Close();
@@ -52,13 +57,15 @@ class Index {
  private:
   void CheckOpen() const;
   IndexWriter& Writer();
-  IndexReader& Reader();
+  std::shared_ptr<IndexReader> Reader();
 
   const IndexDefinition definition_;
   const Mapping mapping_;
-  const std::unique_ptr<DatabaseCheck> check_;
+  DatabaseCheck check_;
   IndexWriter writer_;
-  IndexReader reader_;
+  std::mutex reader_mutex_;  // guards what follows
+  std::shared_ptr<IndexReader> reader_;
+  unsigned reader_generation_ = 0;  // of the files that it reads
   std::atomic<bool> closed_ = false;
 };
 

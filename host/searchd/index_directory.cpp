@@ -25,11 +25,10 @@ constexpr std::size_t kMaxPathBytes = 1024;
 constexpr std::size_t kMaxComponentBytes = 255;
 
 constexpr const char* kMarker = "tovoelasticd.index";
-constexpr const char* kDatabaseVersion = "iamglass";
 constexpr std::array<const char*, 6> kTables = {"docdata.glass",  "postlist.glass",
                                                 "position.glass", "spelling.glass",
                                                 "synonym.glass",  "termlist.glass"};
-constexpr std::array<const char*, 3> kOtherFiles = {kDatabaseVersion, "flintlock", "v.tmp"};
+constexpr std::array<const char*, 3> kOtherFiles = {kVersionFile, "flintlock", "v.tmp"};
 
 [[noreturn]] void Fail(const std::string& path) {
   throw RequestError(Code::kStorage, WithErrno(path, errno));
@@ -103,19 +102,21 @@ bool IsIndexFile(const std::string& name) {
 // The marker goes last: as long as a file of the index is there, the directory is known as ours.
 void RemoveIndexFiles(int dir, const std::string& path) {
   const auto remove = [&](const char* name) {
-    if (unlinkat(dir, name, 0) != 0 && errno != ENOENT) Fail(path + "/" + name);
+    if (unlinkat(dir, name, 0) == 0 || errno == ENOENT) return;
+    // Somebody has put a directory in its place; it goes if it is empty.
+    if (errno != EISDIR || unlinkat(dir, name, AT_REMOVEDIR) != 0) Fail(path + "/" + name);
   };
   for (const char* name : kTables) remove(name);
   for (const char* name : kOtherFiles) remove(name);
   remove(kMarker);
 }
 
-void ClearLeftovers(int dir, const std::string& path) {
+void ClearLeftovers(int dir, const std::string& path, bool known) {
   const std::vector<std::string> names = Entries(dir, path);
   if (names.empty()) return;
-  const bool marked = Contains(names, kMarker);
+  const bool ours = known || Contains(names, kMarker);
   for (const std::string& name : names) {
-    if (marked && IsIndexFile(name)) continue;
+    if (ours && IsIndexFile(name)) continue;
     throw RequestError(Code::kRejected,
                        "\"path\" holds what is not of an index: " + path + "/" + name);
   }
@@ -150,22 +151,25 @@ std::string CheckedIndexPath(const std::string& path) {
   return std::string(kPackages).append(below);
 }
 
-void PrepareIndexDirectory(const std::string& path) {
+void PrepareIndexDirectory(const std::string& path, bool known) {
   const UniqueFd dir(OpenDirectory(path, true));
-  ClearLeftovers(dir.Get(), path);
+  ClearLeftovers(dir.Get(), path, known);
   const UniqueFd marker(
       openat(dir.Get(), kMarker, O_WRONLY | O_CREAT | O_EXCL | O_CLOEXEC, S_IRUSR | S_IWUSR));
   if (!marker.IsOpen()) Fail(path + "/" + kMarker);
 }
 
 void RemoveIndexDirectory(const std::string& path) {
-  {
-    const UniqueFd dir(OpenDirectory(path, false));
-    if (!dir.IsOpen()) return;
-    RemoveIndexFiles(dir.Get(), path);
-  }
+  const std::size_t slash = path.rfind('/');
+  const UniqueFd parent(OpenDirectory(std::string_view(path).substr(0, slash), false));
+  const UniqueFd dir(OpenDirectory(path, false));
+  if (!parent.IsOpen() || !dir.IsOpen()) return;
+  RemoveIndexFiles(dir.Get(), path);
   // One that holds something else stays: whoever put it there may want it.
-  if (rmdir(path.c_str()) != 0 && errno != ENOTEMPTY && errno != EEXIST) Fail(path);
+  if (unlinkat(parent.Get(), path.c_str() + slash + 1, AT_REMOVEDIR) != 0 && errno != ENOTEMPTY &&
+      errno != EEXIST) {
+    Fail(path);
+  }
 }
 
 bool HoldsDatabase(const std::string& path) {
@@ -173,13 +177,43 @@ bool HoldsDatabase(const std::string& path) {
   if (!dir.IsOpen() || !IsFile(dir.Get(), kMarker, 0)) {
     throw RequestError(Code::kStorage, path + "/" + kMarker + " is missing: the index is damaged");
   }
-  if (IsFile(dir.Get(), kDatabaseVersion, 0)) return true;
+  if (IsFile(dir.Get(), kVersionFile, 0)) return true;
   for (const char* table : kTables) {
     if (!IsFile(dir.Get(), table, 1)) continue;
     throw RequestError(Code::kStorage,
-                       path + "/" + kDatabaseVersion + " is missing: the index is damaged");
+                       path + "/" + kVersionFile + " is missing: the index is damaged");
   }
   return false;
+}
+
+std::vector<std::string> TableFiles(const std::string& path) {
+  std::vector<std::string> files;
+  const UniqueFd dir(OpenDirectory(path, false));
+  if (!dir.IsOpen()) return files;
+  for (const std::string& name : Entries(dir.Get(), path)) {
+    if (Contains(kTables, name)) files.push_back(path + "/" + name);
+  }
+  return files;
+}
+
+FilesState StateOfFiles(const std::string& path) {
+  FilesState state;
+  try {
+    const UniqueFd dir(OpenDirectory(path, false));
+    if (!dir.IsOpen()) return state;
+    const auto add = [&](const char* name) {
+      struct stat file {};
+      if (fstatat(dir.Get(), name, &file, AT_SYMLINK_NOFOLLOW) != 0) file = {};
+      state.push_back({static_cast<std::int64_t>(file.st_ino), file.st_mode, file.st_size,
+                       file.st_ctim.tv_sec, file.st_ctim.tv_nsec});
+    };
+    add(kMarker);
+    add(kVersionFile);
+    for (const char* table : kTables) add(table);
+  } catch (const RequestError&) {
+    state.clear();
+  }
+  return state;
 }
 
 void SyncIndexDirectory(const std::string& path, bool parents) {

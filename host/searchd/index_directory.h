@@ -4,7 +4,10 @@
 // as there is one. None of the calls follows a symbolic link below "/var/packages/".
 #pragma once
 
+#include <array>
+#include <cstdint>
 #include <string>
+#include <vector>
 
 namespace searchd {
 
@@ -14,8 +17,9 @@ namespace searchd {
 std::string CheckedIndexPath(const std::string& path);
 
 // Makes the empty directory of a new index with missing parents, mode 0700. What an earlier index
-// left there is cleared; anything else that is found there is rejected.
-void PrepareIndexDirectory(const std::string& path);
+// left there is cleared: it is known by its marker, or the caller has `known` the index. Anything
+// else that is found there is rejected.
+void PrepareIndexDirectory(const std::string& path, bool known);
 
 // Removes an index's files and its directory. A directory that is gone already is no error.
 void RemoveIndexDirectory(const std::string& path);
@@ -23,6 +27,17 @@ void RemoveIndexDirectory(const std::string& path);
 // Whether there is a database to open; false for an index into which nothing was ever committed.
 // Throws RequestError(kStorage) when the directory is not that of an index.
 bool HoldsDatabase(const std::string& path);
+
+// The file of a database that says which state of its tables holds.
+constexpr const char* kVersionFile = "iamglass";
+
+// The files of the database's tables that are there, whatever they hold.
+std::vector<std::string> TableFiles(const std::string& path);
+
+// What tells a state of the index's files from every other: it changes when one of them is written,
+// replaced or removed, by whomever. Empty when the directory cannot be reached.
+using FilesState = std::vector<std::array<std::int64_t, 5>>;
+FilesState StateOfFiles(const std::string& path);
 
 // Makes the directory's entries durable, and with `parents` the directory itself.
 void SyncIndexDirectory(const std::string& path, bool parents);

@@ -1,7 +1,6 @@
 // Searching one index, in its last committed state.
 #pragma once
 
-#include <json/value.h>
 #include <xapian.h>
 
 #include <atomic>
@@ -10,17 +9,11 @@
 #include <mutex>
 #include <string>
 
-#include "host/searchd/analyzer.h"
 #include "host/searchd/database_check.h"
 #include "host/searchd/mapping.h"
+#include "host/searchd/searcher.h"
 
 namespace searchd {
-
-struct SearchResult {
-  Xapian::doccount total = 0;
-  Json::Value hits = Json::Value(Json::arrayValue);
-  bool cut = false;  // the query was longer than is looked at
-};
 
 // Any thread may call. Both queries throw RequestError when the index cannot be read.
 class IndexReader {
@@ -28,7 +21,7 @@ class IndexReader {
   IndexReader(std::string path, const Mapping& mapping, const Language& language,
               DatabaseCheck& check);
 
-  SearchResult Search(const std::string& query, unsigned offset, unsigned limit);
+  SearchResult Search(const SearchRequest& request);
   Xapian::doccount DocumentCount();
 
   // Makes the next call look at the files again.
@@ -48,7 +41,7 @@ class IndexReader {
   DatabaseCheck& check_;
 
   std::mutex mutex_;
-  std::unique_ptr<Analyzer> analyzer_;
+  std::unique_ptr<Searcher> searcher_;
   std::unique_ptr<Xapian::Database> database_;
   bool closed_ = false;
   std::atomic<bool> stale_ = false;

@@ -22,29 +22,29 @@ IndexWriter::IndexWriter(std::string path, const Mapping& mapping, const Languag
     : path_(std::move(path)), mapping_(mapping), language_(language), check_(check) {}
 
 bool IndexWriter::Queue(Change change) {
-  bool many = false;
-  bool full = false;
-  {
-    const std::lock_guard lock(queue_mutex_);
-    ThrowFailure();
-    queued_bytes_ += change.bytes;
-    queue_.push_back(std::move(change));
-    queued_ = true;
-    many = queue_.size() >= kManyQueued;
-    full = queue_.size() >= kMaxQueued || queued_bytes_ >= kMaxQueuedBytes;
+  check_.ThrowIfDamaged();
+  if (IsFull(change.bytes)) {
+    const std::lock_guard lock(write_mutex_);
+    ApplyQueuedLocked();
   }
-  if (!full) return many;
-  const std::lock_guard lock(write_mutex_);
-  ApplyQueuedLocked();
-  return false;
+  const std::lock_guard lock(queue_mutex_);
+  ThrowFailure();
+  queued_bytes_ += change.bytes;
+  queue_.push_back(std::move(change));
+  queued_ = true;
+  busy_ = false;
+  return queue_.size() >= kManyQueued;
 }
 
 void IndexWriter::ApplyQueued() {
   // Whoever holds the lock looks at the queue again after letting go of it.
-  while (queued_) {
+  while (queued_ && !busy_) {
     const std::unique_lock lock(write_mutex_, std::try_to_lock);
     if (!lock) return;
-    ApplyQueuedLocked();
+    try {
+      ApplyQueuedLocked();
+    } catch (const RequestError&) {  // the next change or commit tries again
+    }
   }
 }
 
@@ -55,10 +55,11 @@ void IndexWriter::DoWork() {
     if (!lock || !unflushed_) return;
     unflushed_ = false;
     try {
-      // Listing the terms makes Xapian merge the changes that it keeps in memory.
-      if (database_) database_->allterms_begin();
+      Flush();
     } catch (const Xapian::Error& e) {
-      Drop(e.get_description());
+      Drop(StorageError(path_, e).what());
+    } catch (const std::exception& e) {
+      Drop(e.what());
     }
   }
   ApplyQueued();
@@ -68,36 +69,44 @@ bool IndexWriter::Commit() {
   bool changed = false;
   {
     const std::lock_guard lock(write_mutex_);
+    check_.Await();
     ApplyQueuedLocked();
     {
       const std::lock_guard queue_lock(queue_mutex_);
       ThrowFailure();
     }
     changed = in_transaction_;
-    if (changed) {
-      try {
-        database_->commit_transaction();
-        in_transaction_ = false;
-        unflushed_ = false;
-        SyncIndexDirectory(path_, std::exchange(created_, false));
-      } catch (const Xapian::Error& e) {
-        database_.reset();
-        in_transaction_ = false;
-        throw StorageError(path_, e);
-      }
-    }
+    if (changed) CommitLocked();
+    ReopenLocked();
   }
   ApplyQueued();
   return changed;
 }
 
+void IndexWriter::Reopen() {
+  const std::lock_guard lock(write_mutex_);
+  reopen_ = true;
+  ReopenLocked();
+}
+
 void IndexWriter::Close() {
   const std::lock_guard lock(write_mutex_);
   closed_ = true;
-  ApplyQueuedLocked();
-  database_.reset();
-  in_transaction_ = false;
-  unflushed_ = false;
+  TakeQueue();
+  LetGo();
+}
+
+bool IndexWriter::IsFull(std::size_t more_bytes) {
+  const std::lock_guard lock(queue_mutex_);
+  return queue_.size() >= kMaxQueued ||
+         (!queue_.empty() && queued_bytes_ + more_bytes > kMaxQueuedBytes);
+}
+
+std::deque<Change> IndexWriter::TakeQueue() {
+  const std::lock_guard lock(queue_mutex_);
+  queued_ = false;
+  queued_bytes_ = 0;
+  return std::exchange(queue_, {});
 }
 
 void IndexWriter::ThrowFailure() {
@@ -106,19 +115,16 @@ void IndexWriter::ThrowFailure() {
   throw RequestError(Code::kStorage, failure);
 }
 
+// Throws RequestError(kBusy) when another process holds the index.
 void IndexWriter::ApplyQueuedLocked() {
-  for (;;) {
-    std::deque<Change> changes;
-    {
-      const std::lock_guard lock(queue_mutex_);
-      changes.swap(queue_);
-      queued_ = false;
-      queued_bytes_ = 0;
-    }
-    if (changes.empty() || closed_) return;
+  while (queued_ && !closed_) {
     try {
-      OpenDatabase();
-      for (const Change& change : changes) Apply(change);
+      const DatabaseCheck::Writing writing(check_);
+      OpenDatabase(writing.Generation());
+      for (const Change& change : TakeQueue()) Apply(change);
+    } catch (const Xapian::DatabaseLockError& e) {
+      busy_ = true;
+      throw StorageError(path_, e);
     } catch (const Xapian::Error& e) {
       Drop(StorageError(path_, e).what());
     } catch (const std::exception& e) {
@@ -138,12 +144,36 @@ void IndexWriter::Apply(const Change& change) {
   unflushed_ = true;
 }
 
+void IndexWriter::Flush() {
+  const DatabaseCheck::Writing writing(check_);
+  RenewDatabase(writing.Generation());
+  // Listing the terms makes Xapian merge the changes that it keeps in memory.
+  if (database_) database_->allterms_begin();
+}
+
+void IndexWriter::CommitLocked() {
+  try {
+    const DatabaseCheck::Writing writing(check_);
+    RenewDatabase(writing.Generation());
+    database_->commit_transaction();
+    in_transaction_ = false;
+    unflushed_ = false;
+    SyncIndexDirectory(path_, std::exchange(created_, false));
+  } catch (const Xapian::Error& e) {
+    LetGo();
+    throw StorageError(path_, e);
+  } catch (const RequestError&) {
+    LetGo();
+    throw;
+  }
+}
+
 // All changes up to a commit are one transaction: without it Xapian would commit by itself now and
 // then.
-void IndexWriter::OpenDatabase() {
+void IndexWriter::OpenDatabase(unsigned generation) {
+  RenewDatabase(generation);
   if (!analyzer_) analyzer_ = std::make_unique<Analyzer>(language_);
   if (!database_) {
-    check_.Await();
     const int how = HoldsDatabase(path_) ? Xapian::DB_OPEN : Xapian::DB_CREATE_OR_OPEN;
     database_ = std::make_unique<Xapian::WritableDatabase>(path_, how | Xapian::DB_BACKEND_GLASS);
     created_ = how != Xapian::DB_OPEN;
@@ -152,12 +182,34 @@ void IndexWriter::OpenDatabase() {
   in_transaction_ = true;
 }
 
+// Lets go of files that are not those of the index any more.
+void IndexWriter::RenewDatabase(unsigned generation) {
+  if (std::exchange(generation_, generation) == generation || !database_) return;
+  const bool changed = in_transaction_;
+  LetGo();
+  if (changed) {
+    throw RequestError(Code::kStorage, path_ + ": somebody else has changed the files");
+  }
+}
+
+void IndexWriter::ReopenLocked() {
+  if (!reopen_ || in_transaction_ || closed_) return;
+  reopen_ = false;
+  LetGo();
+  check_.Renew();
+}
+
 void IndexWriter::Drop(const std::string& cause) {
+  LetGo();
+  TakeQueue();
+  const std::lock_guard lock(queue_mutex_);
+  failure_ = "uncommitted changes were lost: " + cause;
+}
+
+void IndexWriter::LetGo() {
   database_.reset();
   in_transaction_ = false;
   unflushed_ = false;
-  const std::lock_guard lock(queue_mutex_);
-  failure_ = "uncommitted changes were lost: " + cause;
 }
 
 }  // namespace searchd

@@ -27,7 +27,8 @@ struct Change {
 //
 // A change is answered for before it is applied, so that a client that pauses between changes does
 // not wait for the work. If applying it fails, all uncommitted changes are lost, and the next Queue
-// or Commit reports that by throwing RequestError, once.
+// or Commit reports that by throwing RequestError, once. While another process holds the index
+// nothing is lost: changes wait, and Commit, and Queue when many wait, throw RequestError(kBusy).
 class IndexWriter {
  public:
   IndexWriter(std::string path, const Mapping& mapping, const Language& language,
@@ -42,21 +43,32 @@ class IndexWriter {
 
   // Whether Commit would find work that can be done beforehand, and doing it: applying what is
   // queued and bringing it on its way to the files.
-  bool HasWork() const { return queued_ || unflushed_; }
+  bool HasWork() const { return (queued_ && !busy_) || unflushed_; }
   void DoWork();
 
   // Applies what is queued and makes all changes durable. Returns whether there were any.
   bool Commit();
 
+  // Lets go of the files and has them checked before they are opened again; if there are
+  // uncommitted changes, as soon as they are committed.
+  void Reopen();
+
   // Drops what was not committed and lets go of the files; later calls do nothing.
   void Close();
 
  private:
+  bool IsFull(std::size_t more_bytes);
+  std::deque<Change> TakeQueue();
   void ThrowFailure();
   void ApplyQueuedLocked();
   void Apply(const Change& change);
-  void OpenDatabase();
+  void Flush();
+  void CommitLocked();
+  void OpenDatabase(unsigned generation);
+  void RenewDatabase(unsigned generation);
+  void ReopenLocked();
   void Drop(const std::string& cause);
+  void LetGo();
 
   const std::string path_;
   const Mapping& mapping_;
@@ -71,10 +83,13 @@ class IndexWriter {
   std::mutex write_mutex_;  // taken before queue_mutex_ where both are needed
   std::unique_ptr<Analyzer> analyzer_;
   std::unique_ptr<Xapian::WritableDatabase> database_;
+  unsigned generation_ = 0;  // of the files that are open
+  bool reopen_ = false;
   bool created_ = false;  // by this object, and nothing committed since
   bool in_transaction_ = false;
   bool closed_ = false;
   std::atomic<bool> queued_ = false;
+  std::atomic<bool> busy_ = false;  // another process held the index at the last attempt
   std::atomic<bool> unflushed_ = false;
 };
 

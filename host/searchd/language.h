@@ -7,6 +7,7 @@ namespace searchd {
 
 struct Language {
   std::string locale;   // as ICU names it; empty: no particular language
+  std::string stemmer;  // as Xapian names it; empty: none
   bool turkic = false;  // I and i are two letters: I folds to dotless i, dotted I to i
 };
 

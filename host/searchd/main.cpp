@@ -6,15 +6,19 @@
 
 #include <cstdio>
 #include <exception>
+#include <optional>
 
 #include "host/device_root.h"
 #include "host/searchd/catalog.h"
+#include "host/searchd/check_process.h"
 #include "host/searchd/dispatcher.h"
 #include "host/searchd/durable_file.h"
 #include "host/searchd/folding.h"
 #include "host/searchd/options.h"
 #include "host/searchd/process.h"
 #include "host/searchd/server.h"
+#include "host/searchd/service_manager.h"
+#include "host/searchd/system_log.h"
 
 namespace searchd {
 namespace {
@@ -31,22 +35,26 @@ constexpr int kFailure = 1;
 constexpr int kWrongUsage = 2;
 constexpr int kAlreadyRunning = 3;
 
-// Everything from the entered root on; `started` is called when requests are accepted.
+// Everything from the entered root on. The socket is the activated one, or made here if that is -1;
+// `started` is called when requests are accepted. Helping processes write to `output`.
 template <typename Started>
-void Serve(const Options& options, Started started) {
+void Serve(const Options& options, int activated, int output, Started started) {
+  const int signals = CatchSignals();
   umask(S_IRWXG | S_IRWXO);
   RaiseDescriptorLimit();
   MakeDirectories(kSocketDirectory, S_IRWXU | S_IRGRP | S_IXGRP | S_IROTH | S_IXOTH);
   MakeDirectories(kStateDirectory, S_IRWXU);
   const ProcessLock lock(kLockFile);
-  Catalog catalog(kRegistryFile);
+  CheckProcess checks(output);
+  Catalog catalog(kRegistryFile, checks);
   Dispatcher dispatcher(catalog);
-  const int stop_signals = CatchStopSignals();
-  const int listener = Listen(kSocketPath);
-  const SocketFile socket_file(kSocketPath);
-  Server server(dispatcher, listener, stop_signals, options.time_limit);
+  std::optional<SocketFile> socket_file;
+  if (activated < 0) socket_file.emplace(kSocketPath);
+  const int listener = activated < 0 ? socket_file->Release() : activated;
+  Server server(dispatcher, listener, signals, options.time_limit);
   syslog(LOG_NOTICE, "started, %zu indexes", catalog.All().size());
   started();
+  NotifyReady();
   server.Run(kWorkers);
   catalog.Save();
   syslog(LOG_NOTICE, "stopped");
@@ -54,11 +62,14 @@ void Serve(const Options& options, Started started) {
 
 void Start(const Options& options) {
   LoadFolding();
+  KeepToOneHeap();
+  const int activated = TakeActivatedSocket();
   const int background_fd = options.foreground ? -1 : GoToBackground();
   const host::sdk::UniqueFd null(open("/dev/null", O_RDWR | O_CLOEXEC));
   if (!options.root.empty()) host::EnterDeviceRoot(options.root);
-  openlog(kName, LOG_PID | (options.foreground ? LOG_PERROR : 0), LOG_DAEMON);
-  Serve(options, [&] {
+  OpenSystemLog(options.foreground);
+  const int output = options.foreground ? STDERR_FILENO : null.Get();
+  Serve(options, activated, output, [&] {
     if (options.ready_fd >= 0) ReportReady(options.ready_fd);
     if (options.foreground) return;
     DropTerminal(null.Get());

@@ -1,6 +1,7 @@
 #include "host/searchd/process.h"
 
 #include <fcntl.h>
+#include <malloc.h>
 #include <sys/file.h>
 #include <sys/resource.h>
 #include <sys/signalfd.h>
@@ -13,6 +14,7 @@
 #include <array>
 #include <cerrno>
 #include <csignal>
+#include <cstdio>
 #include <cstring>
 #include <utility>
 
@@ -58,7 +60,8 @@ bool SomebodyListens(const sockaddr_un& address) {
          errno != ECONNREFUSED;
 }
 
-void RemoveStaleSocket(const std::string& path, const sockaddr_un& address) {
+void RemoveStaleSocket(const std::string& path) {
+  const sockaddr_un address = AddressOf(path);
   struct stat status {};
   if (lstat(path.c_str(), &status) != 0) {
     if (errno == ENOENT) return;
@@ -114,23 +117,24 @@ ProcessLock::ProcessLock(const std::string& file)
   if (ftruncate(fd_.Get(), 0) != 0 || pwrite(fd_.Get(), id.data(), id.size(), 0) < 0) Fail(file);
 }
 
-int Listen(const std::string& path) {
-  const sockaddr_un address = AddressOf(path);
-  RemoveStaleSocket(path, address);
-  UniqueFd listener = MakeSocket();
-  if (!listener.IsOpen()) Fail("socket");
+// It gets its name when it listens already: nobody who sees the file is refused.
+SocketFile::SocketFile(std::string path) : path_(std::move(path)), listener_(MakeSocket()) {
+  if (!listener_.IsOpen()) Fail("socket");
+  RemoveStaleSocket(path_);
+  const std::string unready = path_ + ".new";
+  RemoveStaleSocket(unready);
+  const sockaddr_un address = AddressOf(unready);
   // The mode is right from the first moment: read and write for all.
   const mode_t mask = umask(S_IXUSR | S_IXGRP | S_IXOTH);
   const int bound =
-      bind(listener.Get(), reinterpret_cast<const sockaddr*>(&address), sizeof(address));
+      bind(listener_.Get(), reinterpret_cast<const sockaddr*>(&address), sizeof(address));
   const int error = errno;
   umask(mask);
   errno = error;
-  if (bound != 0 || listen(listener.Get(), SOMAXCONN) != 0) Fail(path);
-  return listener.Release();
-}
-
-SocketFile::SocketFile(std::string path) : path_(std::move(path)) {
+  if (bound != 0 || listen(listener_.Get(), SOMAXCONN) != 0 ||
+      std::rename(unready.c_str(), path_.c_str()) != 0) {
+    Fail(path_);
+  }
   struct stat status {};
   if (lstat(path_.c_str(), &status) != 0) Fail(path_);
   device_ = status.st_dev;
@@ -143,17 +147,19 @@ SocketFile::~SocketFile() {
   if (status.st_dev == device_ && status.st_ino == inode_) unlink(path_.c_str());
 }
 
-int CatchStopSignals() {
+int CatchSignals() {
   std::signal(SIGPIPE, SIG_IGN);
-  sigset_t stop;
-  sigemptyset(&stop);
-  sigaddset(&stop, SIGTERM);
-  sigaddset(&stop, SIGINT);
-  if (sigprocmask(SIG_BLOCK, &stop, nullptr) != 0) Fail("sigprocmask");
-  const int fd = signalfd(-1, &stop, SFD_CLOEXEC | SFD_NONBLOCK);
+  std::signal(SIGXFSZ, SIG_IGN);
+  sigset_t caught;
+  sigemptyset(&caught);
+  for (const int signal : {SIGTERM, SIGINT, SIGHUP}) sigaddset(&caught, signal);
+  if (sigprocmask(SIG_BLOCK, &caught, nullptr) != 0) Fail("sigprocmask");
+  const int fd = signalfd(-1, &caught, SFD_CLOEXEC | SFD_NONBLOCK);
   if (fd < 0) Fail("signalfd");
   return fd;
 }
+
+void KeepToOneHeap() { mallopt(M_ARENA_MAX, 1); }
 
 void RaiseDescriptorLimit() {
   rlimit limit{};

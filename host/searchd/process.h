@@ -34,27 +34,34 @@ class ProcessLock {
   host::sdk::UniqueFd fd_;
 };
 
-// Returns a listening socket at `path` that every user may connect to. A socket that nobody listens
-// on is replaced; anything else that is there is left alone, and std::runtime_error thrown.
-int Listen(const std::string& path);
-
-// Removes the socket file when it goes out of scope, unless another has taken its place.
+// The socket file of the daemon. It goes with the object, unless another has taken its place.
 class SocketFile {
  public:
+  // Makes a listening socket that every user may connect to. A socket that nobody listens on is
+  // replaced; anything else that is there is left alone, and std::runtime_error thrown.
   explicit SocketFile(std::string path);
   ~SocketFile();
   SocketFile(const SocketFile&) = delete;
   SocketFile& operator=(const SocketFile&) = delete;
 
+  // Gives the socket away.
+  int Release() { return listener_.Release(); }
+
  private:
   const std::string path_;
+  host::sdk::UniqueFd listener_;
   dev_t device_ = 0;
   ino_t inode_ = 0;
 };
 
-// Blocks SIGTERM and SIGINT in the calling thread and those it starts, and returns a descriptor
-// that becomes readable when one arrives. SIGPIPE is ignored from then on.
-int CatchStopSignals();
+// Blocks SIGTERM, SIGINT and SIGHUP in the calling thread and those it starts, and returns a
+// signalfd that becomes readable when one arrives. From then on a write to where nobody reads or
+// beyond a limit on file sizes fails without a signal.
+int CatchSignals();
+
+// Lets all threads take memory from one heap: each with its own, they would hold on to several
+// times what they use. Call it before any thread is started.
+void KeepToOneHeap();
 
 // As many descriptors as the system allows: each open index holds several.
 void RaiseDescriptorLimit();

@@ -1,12 +1,9 @@
 #include "host/searchd/query.h"
 
-#include <unicode/utf8.h>
-
-#include <map>
+#include <algorithm>
 #include <utility>
 #include <vector>
 
-#include "host/searchd/ranking.h"
 #include "host/searchd/terms.h"
 
 namespace searchd {
@@ -14,13 +11,8 @@ namespace {
 
 using Xapian::Query;
 
-struct Field {
-  std::string prefix;
-  Role role;
-};
-
 Query Scaled(const Query& query, double factor) {
-  return query.empty() ? query : Query(Query::OP_SCALE_WEIGHT, query, factor);
+  return Query(Query::OP_SCALE_WEIGHT, query, factor);
 }
 
 Query Best(const std::vector<Query>& queries) {
@@ -31,166 +23,152 @@ Query All(const std::vector<Query>& queries) {
   return Query(Query::OP_AND, queries.begin(), queries.end());
 }
 
-// Finds the parts of a query in the members that are searched. Members that are cut into words
-// alike are asked together, so that the words of one text may be found in several members.
-class QueryBuilder {
- public:
-  QueryBuilder(const Mapping& mapping, Analyzer& analyzer) : analyzer_(analyzer) {
-    for (const auto& [name, rule] : mapping.Fields()) AddField(rule, FieldPrefix(name), name);
-    AddField(mapping.DefaultRule(), UnnamedFieldsPrefix(), "");
+Query ToQuery(const Way& way) {
+  std::vector<Query> matches;
+  for (const Match& match : way.matches) {
+    matches.push_back(match.beginning ? Query(Query::OP_WILDCARD, match.term) : Query(match.term));
   }
+  return Scaled(All(matches), way.worth / static_cast<double>(matches.size()));
+}
 
-  // The query for one text without white space.
-  Query ForPart(const std::string& part, bool last) {
-    std::vector<Query> ways;
-    for (const Group& group : groups_) {
-      if (group.rule.ngram) {
-        AddWay(ways, Inside(group, part));
-      } else if (group.rule.analyzer != AnalyzerKind::kKeyword) {
-        AddWay(ways, Words(group, part, last));
-        if (last) AddWay(ways, Unbroken(group, part));
-      }
-    }
-    return ways.empty() ? Query() : Best(ways);
-  }
-
-  // The query for documents that the whole text names.
-  Query ForWhole(const std::string& text) {
-    std::vector<Query> ways;
-    const std::string whole = analyzer_.WholeText(text);
-    if (has_title_ && !whole.empty()) {
-      const std::string term = WholeTitleTerm(whole);
-      ways.push_back(Scaled(Query(term), kWholeTitle));
-      ways.push_back(Scaled(Query(Query::OP_WILDCARD, term), kTitleBeginning));
-    }
-    for (const Group& group : groups_) {
-      if (group.rule.ngram || group.rule.analyzer != AnalyzerKind::kKeyword) continue;
-      AddWay(ways, Words(group, text, false));
-    }
-    return ways.empty() ? Query() : Best(ways);
-  }
-
- private:
-  struct Group {
-    FieldRule rule;
-    std::vector<Field> fields;
-  };
-
-  static void AddWay(std::vector<Query>& ways, const Query& way) {
-    if (!way.empty()) ways.push_back(way);
-  }
-
-  void AddField(const FieldRule& rule, const std::string& prefix, const std::string& name) {
-    if (!rule.in_all) return;
-    const Field field{prefix, RoleOf(name, rule)};
-    if (field.role == Role::kTitle) has_title_ = true;
-    for (Group& group : groups_) {
-      if (group.rule.analyzer == rule.analyzer && group.rule.lower_case == rule.lower_case &&
-          group.rule.ngram == rule.ngram) {
-        group.fields.push_back(field);
-        return;
-      }
-    }
-    groups_.push_back({rule, {field}});
-  }
-
-  Query Words(const Group& group, const std::string& text, bool last) {
-    const std::vector<Word> words = analyzer_.Words(group.rule, text);
-    if (words.empty()) return {};
-    std::vector<Query> queries;
-    for (std::size_t i = 0; i < words.size(); ++i) {
-      queries.push_back(AnyField(group, words[i], last && i + 1 == words.size()));
-    }
-    return Scaled(All(queries), 1.0 / static_cast<double>(queries.size()));
-  }
-
-  // Half a word may look like several in a script without spaces, where the dictionary tells what
-  // is a word: also asks for words that begin with all of it.
-  Query Unbroken(const Group& group, const std::string& text) {
-    const std::vector<Word> words = analyzer_.Words(group.rule, text);
-    if (words.size() < 2) return {};
-    std::string whole;
-    for (const Word& word : words) whole += word.raw;
-    std::vector<Query> ways;
-    for (const Field& field : group.fields) {
-      ways.push_back(Scaled(Query(Query::OP_WILDCARD, WordTermBeginning(field.prefix, whole)),
-                            BeginningWorth(field.role)));
-    }
-    return Best(ways);
-  }
-
-  static Query AnyField(const Group& group, const Word& word, bool beginning) {
-    std::vector<Query> ways;
-    for (const Field& field : group.fields) {
-      AddForm(ways, field, word.raw, beginning);
-      if (word.plain != word.raw) AddForm(ways, field, word.plain, beginning);
-    }
-    return Best(ways);
-  }
-
-  static void AddForm(std::vector<Query>& ways, const Field& field, const std::string& form,
-                      bool beginning) {
-    ways.push_back(Scaled(Query(WordTerm(field.prefix, form)), WordWorth(field.role)));
-    if (!beginning) return;
-    ways.push_back(Scaled(Query(Query::OP_WILDCARD, WordTermBeginning(field.prefix, form)),
-                          BeginningWorth(field.role)));
-  }
-
-  Query Inside(const Group& group, const std::string& text) {
-    std::vector<std::string> grams;
-    for (const Word& word : analyzer_.Words(group.rule, text)) {
-      for (std::string& gram : QueryGrams(word.plain)) grams.push_back(std::move(gram));
-    }
-    if (grams.empty()) return {};
-    std::vector<Query> ways;
-    for (const Field& field : group.fields) {
-      std::vector<Query> terms;
-      for (const std::string& gram : grams) terms.emplace_back(WordTerm(field.prefix, gram));
-      ways.push_back(Scaled(All(terms), WordWorth(field.role) / static_cast<double>(terms.size())));
-    }
-    return Best(ways);
-  }
-
-  Analyzer& analyzer_;
-  std::vector<Group> groups_;
-  bool has_title_ = false;
+// A reading, and which members count. Words that are found in one member's texts are worth more
+// than words from all over the document.
+struct Weighed {
+  const Reading* reading;
+  bool (*counts)(Role role);
+  double factor;
 };
 
-bool CutCharacters(std::string& text) {
-  std::size_t characters = 0;
-  for (std::size_t i = 0; i < text.size(); ++i) {
-    if (U8_IS_TRAIL(static_cast<uint8_t>(text[i]))) continue;
-    if (++characters <= kMaxQueryCharacters) continue;
-    text.resize(i);
+bool IsOfTitle(Role role) { return role == Role::kTitle || role == Role::kInsideTitle; }
+bool IsOfKeywords(Role role) { return role == Role::kKeywords; }
+bool IsAny(Role) { return true; }
+
+void Weigh(std::vector<Weighed>& weighed, const Reading& reading, double factor) {
+  if (reading.empty()) return;
+  if (reading.size() > 1) {
+    weighed.push_back({&reading, IsOfTitle, factor});
+    weighed.push_back({&reading, IsOfKeywords, factor});
+    factor *= kScattered;
+  }
+  weighed.push_back({&reading, IsAny, factor});
+}
+
+std::vector<Weighed> Weigh(const Plan& plan) {
+  std::vector<Weighed> weighed;
+  Weigh(weighed, plan.parts, 1);
+  Weigh(weighed, plan.words, kApart);
+  return weighed;
+}
+
+// Nothing where a required clause cannot be met.
+Query ToQuery(const Weighed& weighed) {
+  std::vector<Query> required;
+  std::vector<Query> optional;
+  for (const Clause& clause : *weighed.reading) {
+    std::vector<Query> ways;
+    for (const Way& way : clause.ways) {
+      if (weighed.counts(way.role)) ways.push_back(ToQuery(way));
+    }
+    if (ways.empty() && clause.optional) continue;
+    if (ways.empty()) return {};
+    (clause.optional ? optional : required).push_back(Best(ways));
+  }
+  Query query =
+      required.empty() ? Query(Query::OP_OR, optional.begin(), optional.end()) : All(required);
+  if (query.empty()) return {};
+  if (!required.empty()) {
+    for (const Query& clause : optional) query = Query(Query::OP_AND_MAYBE, query, clause);
+  }
+  return Scaled(query, weighed.factor / static_cast<double>(weighed.reading->size()));
+}
+
+bool Holds(const DocumentTerms& terms, const Match& match, Xapian::termcount& count) {
+  if (!match.beginning) {
+    const auto found = terms.find(match.term);
+    if (found == terms.end()) return false;
+    count = found->second;
     return true;
   }
-  return false;
+  bool any = false;
+  count = 0;
+  for (auto it = terms.lower_bound(match.term);
+       it != terms.end() && it->first.compare(0, match.term.size(), match.term) == 0; ++it) {
+    any = true;
+    count += it->second;
+  }
+  return any;
+}
+
+// What a way is worth in a document; 0 when it is not there.
+double WorthIn(const DocumentTerms& terms, const Way& way) {
+  double worth = 0;
+  for (const Match& match : way.matches) {
+    Xapian::termcount count = 0;
+    if (!Holds(terms, match, count)) return 0;
+    worth += RepetitionFactor(count);
+  }
+  return worth * way.worth / static_cast<double>(way.matches.size());
+}
+
+Json::Value Reason(const std::string& text, const Way& way, double worth) {
+  Json::Value reason(Json::objectValue);
+  reason["text"] = text;
+  reason["member"] = way.member;
+  reason["found"] = NameOf(way.how);
+  reason["worth"] = worth;
+  return reason;
+}
+
+// The best of some ways to find a text.
+Assessment AssessWays(const std::string& text, const std::vector<Way>& ways,
+                      bool (*counts)(Role role), const DocumentTerms& terms) {
+  Assessment best;
+  for (const Way& way : ways) {
+    if (!counts(way.role)) continue;
+    const double worth = WorthIn(terms, way);
+    if (worth <= best.worth) continue;
+    best.worth = worth;
+    best.how = way.how;
+    best.reasons = Json::Value(Json::arrayValue);
+    best.reasons.append(Reason(text, way, worth));
+  }
+  return best;
+}
+
+Assessment AssessReading(const Weighed& weighed, const DocumentTerms& terms) {
+  Assessment sum;
+  for (const Clause& clause : *weighed.reading) {
+    const Assessment best = AssessWays(clause.text, clause.ways, weighed.counts, terms);
+    if (best.worth == 0 && !clause.optional) return {};
+    sum.worth += best.worth;
+    sum.how = std::max(sum.how, best.how);
+    for (const Json::Value& reason : best.reasons) sum.reasons.append(reason);
+  }
+  sum.worth *= weighed.factor / static_cast<double>(weighed.reading->size());
+  return sum;
 }
 
 }  // namespace
 
-ParsedQuery ParseQuery(const Mapping& mapping, Analyzer& analyzer, const std::string& text) {
-  ParsedQuery parsed;
-  std::string looked_at = text;
-  parsed.cut = CutCharacters(looked_at);
-  std::vector<std::string> parts = SplitWhiteSpace(looked_at);
-  if (parts.size() > kMaxQueryWords) {
-    parts.resize(kMaxQueryWords);
-    parsed.cut = true;
-  }
-
-  QueryBuilder builder(mapping, analyzer);
-  std::vector<Query> words;
-  for (std::size_t i = 0; i < parts.size(); ++i) {
-    Query query = builder.ForPart(parts[i], i + 1 == parts.size());
-    if (!query.empty()) words.push_back(std::move(query));
-  }
+Query ToQuery(const Plan& plan) {
   std::vector<Query> ways;
-  if (!words.empty()) ways.push_back(Scaled(All(words), 1.0 / static_cast<double>(words.size())));
-  const Query whole = builder.ForWhole(looked_at);
-  if (!whole.empty()) ways.push_back(whole);
-  if (!ways.empty()) parsed.query = Best(ways);
-  return parsed;
+  for (const Way& way : plan.whole) ways.push_back(ToQuery(way));
+  for (const Weighed& weighed : Weigh(plan)) {
+    Query query = ToQuery(weighed);
+    if (!query.empty()) ways.push_back(std::move(query));
+  }
+  if (ways.empty()) return {};
+  return Query(Query::OP_AND_MAYBE, Best(ways), Scaled(Query(kApplicationTerm), kApplicationWorth));
+}
+
+Assessment Assess(const Plan& plan, const DocumentTerms& terms) {
+  Assessment best = AssessWays(plan.text, plan.whole, IsAny, terms);
+  for (const Weighed& weighed : Weigh(plan)) {
+    Assessment assessment = AssessReading(weighed, terms);
+    if (assessment.worth > best.worth) best = std::move(assessment);
+  }
+  if (best.worth > 0 && terms.count(kApplicationTerm) != 0) best.worth += kApplicationWorth;
+  return best;
 }
 
 }  // namespace searchd

@@ -1,25 +1,28 @@
-// From what a person types to what an index is asked.
+// A plan as Xapian carries it out, and what it says of one document.
 #pragma once
 
+#include <json/value.h>
 #include <xapian.h>
 
+#include <map>
 #include <string>
 
-#include "host/searchd/analyzer.h"
-#include "host/searchd/mapping.h"
+#include "host/searchd/plan.h"
 
 namespace searchd {
 
-constexpr std::size_t kMaxQueryCharacters = 256;
-constexpr std::size_t kMaxQueryWords = 16;
+// The query whose weights, under WorthWeight, are what Assess says of each document that it finds.
+Xapian::Query ToQuery(const Plan& plan);
 
-struct ParsedQuery {
-  Xapian::Query query;  // empty when the text holds no word
-  bool cut = false;     // the text was longer than is looked at
+// The terms of a document, and how often each stands in it.
+using DocumentTerms = std::map<std::string, Xapian::termcount>;
+
+struct Assessment {
+  double worth = 0;           // 0: the plan does not find the document
+  How how = How::kWholeText;  // the least that one of the typed words was found by
+  Json::Value reasons = Json::Value(Json::arrayValue);  // for people: what was found, where and how
 };
 
-// All words of `text` must be found, each in any of the members that are searched when none is
-// named; the last one may be the beginning of a word.
-ParsedQuery ParseQuery(const Mapping& mapping, Analyzer& analyzer, const std::string& text);
+Assessment Assess(const Plan& plan, const DocumentTerms& terms);
 
 }  // namespace searchd

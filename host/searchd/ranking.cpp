@@ -5,6 +5,54 @@ namespace {
 
 constexpr double kRepetition = 0.1;
 
+double TitleWorth(How how) {
+  switch (how) {
+    case How::kWholeText:
+      return 100;
+    case How::kWholeBeginning:
+      return 80;
+    case How::kWord:
+      return 60;
+    case How::kStem:
+      return 28;
+    case How::kBeginning:
+      return 50;
+    default:
+      return WorthOf(Role::kInsideTitle, how);
+  }
+}
+
+double KeywordWorth(How how) {
+  switch (how) {
+    case How::kWord:
+      return 30;
+    case How::kBeginning:
+      return 24;
+    case How::kStem:
+      return 22;
+    case How::kInside:
+      return 20;
+    default:
+      return 0;
+  }
+}
+
+double BodyWorth(How how) {
+  switch (how) {
+    case How::kWholeText:
+    case How::kWord:
+      return 12;
+    case How::kStem:
+      return 11;
+    case How::kBeginning:
+      return 10;
+    case How::kInside:
+      return 8;
+    default:
+      return 0;
+  }
+}
+
 }  // namespace
 
 Role RoleOf(const std::string& member, const FieldRule& rule) {
@@ -14,42 +62,66 @@ Role RoleOf(const std::string& member, const FieldRule& rule) {
   return Role::kBody;
 }
 
+bool IsFoundByParts(Role role) { return role == Role::kTitle || role == Role::kInsideTitle; }
+
 bool IsShownInHits(const std::string& member) {
-  return member != "keywords" && member != "search_title";
+  return member != "keywords" && member != "search_title" && member != "score" &&
+         member != "explain";
 }
 
-double WordWorth(Role role) {
+std::string NameOf(How how) {
+  switch (how) {
+    case How::kWholeText:
+      return "whole";
+    case How::kWord:
+      return "word";
+    case How::kStem:
+      return "stem";
+    case How::kWholeBeginning:
+      return "whole beginning";
+    case How::kBeginning:
+      return "beginning";
+    case How::kInside:
+      return "inside";
+    case How::kTypo:
+      break;
+  }
+  return "typo";
+}
+
+double WorthOf(Role role, How how) {
   switch (role) {
     case Role::kTitle:
-      return 60;
+      return TitleWorth(how);
     case Role::kInsideTitle:
-      return 40;
+      return how == How::kInside ? 40 : 0;
     case Role::kKeywords:
-      return 30;
+      return KeywordWorth(how);
     case Role::kBody:
       break;
   }
-  return 12;
+  return BodyWorth(how);
 }
 
-double BeginningWorth(Role role) {
+double PhraseWorth(Role role) {
   switch (role) {
     case Role::kTitle:
-      return 50;
-    case Role::kInsideTitle:
-      return 40;
+      return 64;
     case Role::kKeywords:
-      return 25;
-    case Role::kBody:
-      break;
+      return 34;
+    default:
+      return 0;
   }
-  return 10;
+}
+
+double RepetitionFactor(Xapian::termcount count) {
+  const double repeated = count > 1 ? count - 1.0 : 0.0;
+  return 1 + kRepetition * repeated / (repeated + 4);
 }
 
 double WorthWeight::get_sumpart(Xapian::termcount count, Xapian::termcount,
                                 Xapian::termcount) const {
-  const double repeated = count > 1 ? count - 1.0 : 0.0;
-  return worth_ * (1 + kRepetition * repeated / (repeated + 4));
+  return worth_ * RepetitionFactor(count);
 }
 
 double WorthWeight::get_maxpart() const { return worth_ * (1 + kRepetition); }

@@ -1,10 +1,12 @@
 #include "host/searchd/registry.h"
 
+#include <sys/stat.h>
+
 #include <cerrno>
 #include <cstdio>
-#include <fstream>
-#include <iterator>
+#include <optional>
 
+#include "host/sdk/regular_file.h"
 #include "host/searchd/durable_file.h"
 #include "host/searchd/index_directory.h"
 #include "host/searchd/json_text.h"
@@ -14,6 +16,8 @@ namespace searchd {
 namespace {
 
 constexpr int kFormat = 1;
+// More than the entries of all indexes that there may be.
+constexpr std::size_t kMaxBytes = std::size_t{64} * 1024 * 1024;
 
 // Throws RequestError for a text that is not a registry.
 std::vector<IndexDefinition> Parse(const std::string& text) {
@@ -33,6 +37,14 @@ std::vector<IndexDefinition> Parse(const std::string& text) {
   return indexes;
 }
 
+// `name`, with a number added if there is something of that name.
+std::string FreeName(const std::string& name) {
+  struct stat status {};
+  std::string free = name;
+  for (int i = 2; lstat(free.c_str(), &status) == 0; ++i) free = name + "." + std::to_string(i);
+  return free;
+}
+
 }  // namespace
 
 std::string RegistryEntry(const IndexDefinition& index) {
@@ -45,20 +57,17 @@ std::string RegistryEntry(const IndexDefinition& index) {
 
 std::vector<IndexDefinition> Registry::Load(std::string& damage) const {
   damage.clear();
-  errno = 0;
-  std::ifstream in(file_, std::ios::binary);
-  if (!in) {
-    if (errno == ENOENT) return {};
-    throw RequestError(Code::kStorage, WithErrno(file_, errno));
-  }
-  const std::string text{std::istreambuf_iterator<char>(in), std::istreambuf_iterator<char>()};
+  const std::optional<std::string> text = host::sdk::ReadRegularFile(file_, kMaxBytes);
+  if (!text && errno == ENOENT) return {};
   try {
-    return Parse(text);
+    if (!text) throw RequestError(Code::kStorage, WithErrno("it cannot be read", errno));
+    return Parse(*text);
   } catch (const RequestError& e) {
     damage = file_ + ": " + e.what();
   }
-  if (std::rename(file_.c_str(), (file_ + ".damaged").c_str()) != 0) {
-    throw RequestError(Code::kStorage, WithErrno(file_, errno));
+  const std::string aside = FreeName(file_ + ".damaged");
+  if (std::rename(file_.c_str(), aside.c_str()) != 0) {
+    throw RequestError(Code::kStorage, WithErrno("cannot set aside " + damage, errno));
   }
   return {};
 }

@@ -15,9 +15,10 @@ class Registry {
  public:
   explicit Registry(std::string file) : file_(std::move(file)) {}
 
-  // The registered indexes; none when there is no file. A file that does not hold a registry is
-  // moved aside, to the same name with ".damaged" added, and there are none; `damage` then says
-  // what was wrong. Throws RequestError(kStorage) when the file cannot be read.
+  // The registered indexes; none when there is no file. What is there but cannot be read as a
+  // registry is moved aside, to the same name with ".damaged" added, or ".damaged.2" and so on if
+  // that is taken, and there are none; `damage` then says what was wrong. Throws
+  // RequestError(kStorage) when it cannot be moved.
   std::vector<IndexDefinition> Load(std::string& damage) const;
 
   // Replaces the file, durably, by one with these entries: after a crash it holds either them or

@@ -26,6 +26,12 @@ class RequestError : public std::runtime_error {
   Code code_;
 };
 
+// Damage of the daemon's files that the system log has a line about already.
+class KnownDamage : public RequestError {
+ public:
+  explicit KnownDamage(const std::string& message) : RequestError(Code::kStorage, message) {}
+};
+
 // `message` with what errno says added; read errno before anything else can change it.
 std::string WithErrno(const std::string& message, int error);
 

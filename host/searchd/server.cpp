@@ -4,18 +4,21 @@
 #include <sched.h>
 #include <sys/epoll.h>
 #include <sys/eventfd.h>
+#include <sys/signalfd.h>
 #include <sys/socket.h>
 #include <syslog.h>
 #include <unistd.h>
 
 #include <algorithm>
 #include <cerrno>
+#include <csignal>
 #include <cstdint>
 #include <stdexcept>
 #include <thread>
 #include <utility>
 
 #include "host/searchd/request_error.h"
+#include "host/searchd/service_manager.h"
 
 namespace searchd {
 namespace {
@@ -28,15 +31,17 @@ constexpr milliseconds kAcceptPause(100);
 // A client sends its request right after it has connected. Looking for it this long spares it the
 // time to wake a sleeping thread a second time.
 constexpr std::chrono::microseconds kLookForRequest(100);
+// How long requests are taken after the stop signal, if there is always one that has arrived.
+constexpr milliseconds kLastRequests(1000);
 // How long the end of the daemon waits for a client to take its reply.
 constexpr int kLastSendMilliseconds = 1000;
 
 }  // namespace
 
-Server::Server(Handler& handler, int listener, int stop_signals, milliseconds time_limit)
+Server::Server(Handler& handler, int listener, int signals, milliseconds time_limit)
     : handler_(handler),
       listener_(listener),
-      stop_signals_(stop_signals),
+      signals_(signals),
       events_(epoll_create1(EPOLL_CLOEXEC)),
       wake_(eventfd(0, EFD_CLOEXEC | EFD_NONBLOCK)),
       time_limit_(time_limit) {
@@ -44,7 +49,7 @@ Server::Server(Handler& handler, int listener, int stop_signals, milliseconds ti
     throw std::runtime_error(WithErrno("cannot wait for clients", errno));
   }
   Watch(wake_.Get(), EPOLLIN);
-  Watch(stop_signals_.Get(), EPOLLIN);
+  Watch(signals_.Get(), EPOLLIN);
 }
 
 void Server::Run(unsigned workers) {
@@ -83,6 +88,7 @@ Server::Task Server::NextTask() {
   for (;;) {
     std::shared_ptr<Connection> connection = WaitForRequest();
     if (stopped_) return nullptr;
+    if (std::exchange(reopen_, false)) return ReopenTask();
     if (!connection) return IdleTask();
     std::string request = connection->TakeRequest();
     if (!handler_.IsQuick(request)) {
@@ -101,6 +107,14 @@ Server::Task Server::IdleTask() {
     handler_.DoIdleWork();
     idle_work_runs_ = false;
     eventfd_write(wake_.Get(), 1);
+  };
+}
+
+Server::Task Server::ReopenTask() {
+  return [this] {
+    NotifyReloading();
+    handler_.Reopen();
+    NotifyReady();
   };
 }
 
@@ -130,18 +144,22 @@ void Server::FinishSending() {
   connections_.clear();
 }
 
-// Returns a connection with a complete request, or null when it is time to stop or to do idle work.
+// Returns a connection with a complete request, or null when it is time to stop, to reopen or to do
+// idle work.
 std::shared_ptr<Connection> Server::WaitForRequest() {
   for (;;) {
     DropExpired();
     UpdateListening();
-    const bool idle_work = !idle_work_runs_ && handler_.HasIdleWork();
+    const bool stopping = stop_by_ != TimePoint::max();
+    const bool idle_work = !stopping && !idle_work_runs_ && handler_.HasIdleWork();
     epoll_event event{};
-    const int found = epoll_wait(events_.Get(), &event, 1, WaitMilliseconds(idle_work));
-    if (found == 0 && idle_work) return nullptr;
+    const int wait = stopping ? 0 : WaitMilliseconds(idle_work);
+    const int found = epoll_wait(events_.Get(), &event, 1, wait);
+    stopped_ = stopping && (found == 0 || Clock::now() >= stop_by_);
+    if (stopped_ || (found == 0 && idle_work)) return nullptr;
     if (found <= 0) continue;
     if (auto connection = HandleEvent(event.data.fd)) return connection;
-    if (stopped_) return nullptr;
+    if (reopen_) return nullptr;
   }
 }
 
@@ -158,8 +176,8 @@ int Server::WaitMilliseconds(bool idle_work) const {
 // Returns a connection whose request is complete.
 std::shared_ptr<Connection> Server::HandleEvent(int fd) {
   if (fd == listener_.Get()) return Accept();
-  if (fd == stop_signals_.Get()) {
-    stopped_ = true;
+  if (fd == signals_.Get()) {
+    TakeSignal();
     return nullptr;
   }
   if (fd == wake_.Get()) {
@@ -173,6 +191,17 @@ std::shared_ptr<Connection> Server::HandleEvent(int fd) {
   Unwatch(fd);
   connection->Continue();
   return Continue(std::move(connection));
+}
+
+void Server::TakeSignal() {
+  signalfd_siginfo signal{};
+  if (read(signals_.Get(), &signal, sizeof(signal)) != sizeof(signal)) return;
+  if (signal.ssi_signo == SIGHUP) {
+    reopen_ = true;
+  } else {
+    NotifyStopping();
+    stop_by_ = Clock::now() + kLastRequests;
+  }
 }
 
 std::shared_ptr<Connection> Server::Accept() {

@@ -26,14 +26,14 @@ constexpr std::size_t kMaxConnections = 256;
 
 class Server {
  public:
-  // Takes a listening socket, and a signalfd that becomes readable when it is time to stop. A
-  // client has `time_limit` to deliver its request and again to take the reply. Throws
-  // std::runtime_error.
-  Server(Handler& handler, int listener, int stop_signals, std::chrono::milliseconds time_limit);
+  // Takes a listening socket, and a signalfd: SIGHUP makes the handler reopen what it holds, any
+  // other signal is the time to stop. A client has `time_limit` to deliver its request and again to
+  // take the reply. Throws std::runtime_error.
+  Server(Handler& handler, int listener, int signals, std::chrono::milliseconds time_limit);
 
   // Serves: the caller's thread waits for requests and answers quick ones, `workers` threads (one
-  // or more) answer the others. Returns after a stop signal, when the requests at hand are
-  // answered; requests that are not complete then are dropped.
+  // or more) answer the others. Returns after a stop signal, when the requests that have arrived
+  // are answered; requests that are not complete then are dropped.
   void Run(unsigned workers);
 
  private:
@@ -51,9 +51,11 @@ class Server {
   // For the thread that waits.
   Task NextTask();
   Task IdleTask();
+  Task ReopenTask();
   std::shared_ptr<Connection> WaitForRequest();
   int WaitMilliseconds(bool idle_work) const;
   std::shared_ptr<Connection> HandleEvent(int fd);
+  void TakeSignal();
   std::shared_ptr<Connection> Accept();
   std::shared_ptr<Connection> Continue(std::shared_ptr<Connection> connection);
   void TakeBack();
@@ -64,7 +66,7 @@ class Server {
 
   Handler& handler_;
   const host::sdk::UniqueFd listener_;
-  const host::sdk::UniqueFd stop_signals_;
+  const host::sdk::UniqueFd signals_;
   const host::sdk::UniqueFd events_;
   const host::sdk::UniqueFd wake_;
   const std::chrono::milliseconds time_limit_;
@@ -72,8 +74,10 @@ class Server {
   // The waiting thread's own.
   std::map<int, std::shared_ptr<Connection>> connections_;
   bool listening_ = false;
-  TimePoint accept_again_;  // set after the system had no descriptor to give
+  TimePoint accept_again_;                // set after the system had no descriptor to give
+  TimePoint stop_by_ = TimePoint::max();  // the stop signal sets it
   bool stopped_ = false;
+  bool reopen_ = false;
 
   std::mutex tasks_mutex_;
   std::condition_variable posted_;

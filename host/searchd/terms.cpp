@@ -8,7 +8,7 @@
 namespace searchd {
 namespace {
 
-// A term has at most 245 bytes, of which a prefix takes up to 65.
+// A term has at most 245 bytes, of which a prefix takes up to 66.
 constexpr std::size_t kMaxWordBytes = 160;
 constexpr std::size_t kDigestBytes = 32;
 constexpr std::size_t kMaxBeginningBytes = kMaxWordBytes - kDigestBytes;
@@ -44,15 +44,9 @@ std::string Digest(const std::string& text) {
 
 std::string KeyTerm(const std::string& document_id) { return WordTerm("Q", document_id); }
 
-std::string WholeTitleTerm(const std::string& whole_text) {
-  return "=" + Cut(whole_text, kMaxWordBytes);
+std::string FieldPrefix(const std::string& member, Space space) {
+  return static_cast<char>(kFieldPrefix + member.size()) + member + static_cast<char>(space);
 }
-
-std::string FieldPrefix(const std::string& member) {
-  return static_cast<char>(kFieldPrefix + member.size()) + member;
-}
-
-std::string UnnamedFieldsPrefix() { return FieldPrefix(""); }
 
 std::string WordTerm(const std::string& prefix, const std::string& word) {
   if (word.size() <= kMaxWordBytes) return prefix + word;
@@ -61,6 +55,10 @@ std::string WordTerm(const std::string& prefix, const std::string& word) {
 
 std::string WordTermBeginning(const std::string& prefix, const std::string& beginning) {
   return prefix + Cut(beginning, kMaxBeginningBytes);
+}
+
+std::string Pair(const std::string& first, const std::string& second) {
+  return first + ' ' + second;
 }
 
 }  // namespace searchd

@@ -29,6 +29,8 @@ class CatalogTest : public test::DeviceRootTest {
  protected:
   CatalogTest() { test::MakeDirs("/var/lib/tovoelasticd"); }
 
+  CheckProcess checks_{STDERR_FILENO};
+
   static bool IsRegistered(const std::string& id) {
     return ReadFile(kRegistryFile).find("\"" + id + "\"") != std::string::npos;
   }
@@ -45,7 +47,7 @@ class CatalogTest : public test::DeviceRootTest {
 };
 
 TEST_F(CatalogTest, KnowsAnIndexAtOnceAndAfterARestartOnceItIsSaved) {
-  Catalog catalog(kRegistryFile);
+  Catalog catalog(kRegistryFile, checks_);
   EXPECT_FALSE(catalog.NeedsSave());
   catalog.Create(Definition("a"));
   EXPECT_EQ(catalog.Find("a")->Definition().path, kPath);
@@ -54,11 +56,11 @@ TEST_F(CatalogTest, KnowsAnIndexAtOnceAndAfterARestartOnceItIsSaved) {
 
   catalog.Save();
   EXPECT_FALSE(catalog.NeedsSave());
-  EXPECT_EQ(Catalog(kRegistryFile).Find("a")->Definition().path, kPath);
+  EXPECT_EQ(Catalog(kRegistryFile, checks_).Find("a")->Definition().path, kPath);
 }
 
 TEST_F(CatalogTest, KeepsTheFilesOfADeletedIndexUntilThatIsSaved) {
-  Catalog catalog(kRegistryFile);
+  Catalog catalog(kRegistryFile, checks_);
   catalog.Create(Definition("a"));
   catalog.Save();
   catalog.Delete("a");
@@ -72,7 +74,7 @@ TEST_F(CatalogTest, KeepsTheFilesOfADeletedIndexUntilThatIsSaved) {
 }
 
 TEST_F(CatalogTest, MakesAnIndexAnewWhereItWasDeleted) {
-  Catalog catalog(kRegistryFile);
+  Catalog catalog(kRegistryFile, checks_);
   catalog.Create(Definition("a"));
   catalog.Save();
   catalog.Delete("a");
@@ -83,7 +85,7 @@ TEST_F(CatalogTest, MakesAnIndexAnewWhereItWasDeleted) {
 }
 
 TEST_F(CatalogTest, ForgetsAnIndexForGoodBeforeAnotherTakesItsDirectory) {
-  Catalog catalog(kRegistryFile);
+  Catalog catalog(kRegistryFile, checks_);
   catalog.Create(Definition("a"));
   catalog.Save();
   catalog.Delete("a");
@@ -99,7 +101,7 @@ TEST_F(CatalogTest, ForgetsAnIndexForGoodBeforeAnotherTakesItsDirectory) {
 }
 
 TEST_F(CatalogTest, ReportsARegistryThatCannotBeWrittenAndTriesAgain) {
-  Catalog catalog(kRegistryFile);
+  Catalog catalog(kRegistryFile, checks_);
   catalog.Create(Definition("a"));
   test::MakeDirs(std::string(kRegistryFile) + ".tmp");
   catalog.SaveIfNeeded();
@@ -114,7 +116,7 @@ TEST_F(CatalogTest, ReportsARegistryThatCannotBeWrittenAndTriesAgain) {
 
 TEST_F(CatalogTest, SaysWhichIndexesADamagedRegistryHasLost) {
   WriteFile(kRegistryFile, "{\"format\":1,");
-  Catalog catalog(kRegistryFile);
+  Catalog catalog(kRegistryFile, checks_);
   EXPECT_EQ(FailureOf([&] { catalog.Find("a"); }), Code::kStorage);
   EXPECT_EQ(FailureOf([&] { catalog.Find("b"); }), Code::kStorage);
 

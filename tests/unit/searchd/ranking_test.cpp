@@ -3,114 +3,166 @@
 #include <gtest/gtest.h>
 
 #include <string>
+#include <utility>
 #include <vector>
 
-#include "host/searchd/document.h"
-#include "host/searchd/json_text.h"
-#include "host/searchd/query.h"
+#include "tests/unit/searchd/memory_index.h"
 
 namespace searchd {
 namespace {
 
-using Ids = std::vector<std::string>;
-
-// Documents in memory and the order in which a query finds them.
-class RankingTest : public testing::Test {
- protected:
-  void Add(const std::string& id, const std::string& title, const std::string& keywords = "",
-           const std::string& desc = "") {
-    Json::Value document(Json::objectValue);
-    document["id"] = id;
-    document["title"] = title;
-    document["search_title"] = title;
-    document["keywords"] = keywords;
-    document["desc"] = desc;
-    database_.replace_document("Q" + id, BuildDocument(mapping_, analyzer_, id, document));
-  }
-
-  Ids Find(const std::string& text) {
-    Xapian::Enquire enquire(database_);
-    enquire.set_query(ParseQuery(mapping_, analyzer_, text).query);
-    enquire.set_weighting_scheme(WorthWeight());
-    enquire.set_sort_by_relevance_then_value(kOrderSlot, false);
-    Ids ids;
-    const Xapian::MSet matches = enquire.get_mset(0, 1000);
-    for (auto it = matches.begin(); it != matches.end(); ++it) {
-      ids.push_back(ParseJson(it.get_document().get_data())["id"].asString());
-    }
-    return ids;
-  }
-
-  const Mapping mapping_ = Mapping::Parse(ParseJson(R"({
-    "property_id": "id",
-    "properties": {
-      "id": {"analyzer": "keyword", "_all": false},
-      "title": {}, "desc": {}, "keywords": {},
-      "search_title": {"analyzer": "white space", "preprocess": ["tolower", "ngram"]}}})"));
-  Analyzer analyzer_{LanguageOfIndex("x_enu")};
-  Xapian::WritableDatabase database_{"", Xapian::DB_BACKEND_INMEMORY};
-};
-
-TEST_F(RankingTest, PutsTitlesAboveKeywordsAboveDescriptions) {
-  Add("desc", "One", "", "about mail");
-  Add("keyword", "Two", "mail");
-  Add("inside", "Webmail");
-  Add("word beginning", "My Mailbox");
-  Add("word", "My Mail");
-  Add("title beginning", "Mailman");
-  Add("title", "Mail");
-  Add("nothing", "Calendar");
-  EXPECT_EQ(Find("mail"), (Ids{"title", "title beginning", "word", "word beginning", "inside",
-                               "keyword", "desc"}));
+TEST(RankingTest, PutsTitlesAboveKeywordsAboveDescriptions) {
+  MemoryIndex index;
+  index.Add("desc", "One", "", "about mail");
+  index.Add("keyword", "Two", "two mail");
+  index.Add("inside", "Webmail");
+  index.Add("word beginning", "My Mailbox");
+  index.Add("word", "My Mail");
+  index.Add("title beginning", "Mailman");
+  index.Add("title", "Mail");
+  index.Add("nothing", "Calendar");
+  EXPECT_EQ(index.Find("mail"), (Strings{"title", "title beginning", "word", "word beginning",
+                                         "inside", "keyword", "desc"}));
 }
 
-TEST_F(RankingTest, CountsRepeatedKeywords) {
-  Add("a", "One", "mail");
-  Add("b", "Two", "mail mail mail");
-  Add("c", "Three", "mail mail mail mail mail");
-  EXPECT_EQ(Find("mail"), (Ids{"c", "b", "a"}));
+TEST(RankingTest, PutsWordsInTheTitleAboveThoseAllOverTheDocument) {
+  MemoryIndex index;
+  index.Add("desc", "One", "", "a server for mail");
+  index.Add("all over", "Server", "server mail");
+  index.Add("keywords", "Two", "two mail server");
+  index.Add("other order", "Server for Mail");
+  index.Add("together", "The Mail Server");
+  index.Add("title beginning", "Mail Server Pro");
+  index.Add("title", "Mail Server");
+  const Strings found = index.Find("mail server");
+  ASSERT_EQ(found.size(), 7U);
+  EXPECT_EQ(Strings(found.begin(), found.begin() + 4),
+            (Strings{"title", "title beginning", "together", "other order"}));
+  EXPECT_EQ(found.back(), "desc");
 }
 
-TEST_F(RankingTest, NoNumberOfRepetitionsBeatsATitle) {
+TEST(RankingTest, PutsWordsInTheKeywordsAboveThoseAllOverTheDocument) {
+  MemoryIndex index;
+  index.Add("all over", "Server", "server", "sends mail");
+  index.Add("keywords", "One", "one mail big server");
+  EXPECT_EQ(index.Find("server mail"), (Strings{"keywords", "all over"}));
+}
+
+TEST(RankingTest, CountsRepeatedKeywords) {
+  MemoryIndex index;
+  index.Add("a", "One", "one mail");
+  index.Add("b", "Two", "two mail mail mail");
+  index.Add("c", "Three", "three mail mail mail mail mail");
+  index.Add("d", "Four", "four mail mail");
+  EXPECT_EQ(index.Find("mail"), (Strings{"c", "b", "d", "a"}));
+  EXPECT_EQ(index.Find("mai"), (Strings{"c", "b", "d", "a"}));
+}
+
+TEST(RankingTest, NoNumberOfRepetitionsBeatsATitle) {
   std::string keywords;
   for (int i = 0; i < 1000; ++i) keywords += "mail ";
-  Add("a", "One", keywords);
-  Add("b", "Webmail");
-  EXPECT_EQ(Find("mail"), (Ids{"b", "a"}));
+  MemoryIndex index;
+  index.Add("a", "One", "one " + keywords);
+  index.Add("b", "Webmail");
+  EXPECT_EQ(index.Find("mail"), (Strings{"b", "a"}));
 }
 
-TEST_F(RankingTest, OrdersEqualHitsByTitleThenId) {
-  Add("3", "Mail zebra");
-  Add("2", "mail Äpfel");
-  Add("9", "Mail apple");
-  Add("1", "Mail zebra");
-  EXPECT_EQ(Find("mail"), (Ids{"2", "9", "1", "3"}));
+TEST(RankingTest, RepeatedWordsOutsideTheKeywordsSayNothing) {
+  MemoryIndex index;
+  index.Add("1", "Mail A", "", "about letters");
+  index.Add("2", "Mail Mail Mail", "", "letters letters letters");
+  EXPECT_EQ(index.Find("letters"), (Strings{"1", "2"}));
 }
 
-TEST_F(RankingTest, WantsAllWordsInAnyMember) {
-  Add("a", "Mail Server", "smtp", "sends letters");
-  Add("b", "Mail Client", "", "sends letters");
-  EXPECT_EQ(Find("server let"), Ids{"a"});
-  EXPECT_EQ(Find("mail smtp sends"), Ids{"a"});
-  EXPECT_EQ(Find("mail zebra"), Ids{});
-  EXPECT_EQ(Find("let mail"), (Ids{}));  // a beginning only where the typing goes on
+TEST(RankingTest, OrdersEqualHitsByTitleThenId) {
+  MemoryIndex index;
+  index.Add("3", "Mail zebra");
+  index.Add("2", "mail Äpfel");
+  index.Add("9", "Mail apple");
+  index.Add("1", "Mail zebra");
+  EXPECT_EQ(index.Find("mail"), (Strings{"2", "9", "1", "3"}));
 }
 
-TEST_F(RankingTest, FindsNothingForNothing) {
-  Add("a", "Mail");
-  EXPECT_EQ(Find(""), Ids{});
-  EXPECT_EQ(Find("?!"), Ids{});
+TEST(RankingTest, OrdersTitlesAsTheLanguageDoes) {
+  for (const auto& [language, order] : std::vector<std::pair<std::string, Strings>>{
+           {"sve", {"App Apa", "App Zon", "App Åka", "App Äta", "App Öga"}},
+           {"ger", {"App Apfel", "App Ärzte", "App Auto", "App Öl", "App Zeit"}},
+           {"dan", {"App Ad", "App Zo", "App Æble", "App Øl", "App Ål"}},
+           {"csy", {"App Cena", "App Duha", "App Hora", "App Chata", "App Ibis"}},
+           {"spn", {"App Nube", "App Ñandú", "App Oso"}},
+           {"rus", {"App Ежа", "App Ёлка", "App Ель", "App Жук"}}}) {
+    MemoryIndex index(language);
+    for (const std::string& title : order) index.Add(title, title);
+    EXPECT_EQ(index.Find("app"), order) << language;
+  }
 }
 
-TEST_F(RankingTest, CutsALongQuery) {
-  std::string words;
-  for (std::size_t i = 0; i <= kMaxQueryWords; ++i) words += "m ";
-  EXPECT_TRUE(ParseQuery(mapping_, analyzer_, words).cut);
-  EXPECT_TRUE(ParseQuery(mapping_, analyzer_, std::string(kMaxQueryCharacters + 1, 'x')).cut);
-  EXPECT_FALSE(ParseQuery(mapping_, analyzer_, std::string(kMaxQueryCharacters, 'x')).cut);
-  std::string wide;
-  for (std::size_t i = 0; i < kMaxQueryCharacters; ++i) wide += "文";
-  EXPECT_FALSE(ParseQuery(mapping_, analyzer_, wide).cut);
+TEST(RankingTest, PutsApplicationsBeforeTheirParts) {
+  MemoryIndex index;
+  index.Add("part", "Mail alpha", "", "", "app");
+  index.Add("app", "Mail beta");
+  EXPECT_EQ(index.Find("mail"), (Strings{"app", "part"}));
+  EXPECT_EQ(index.Find("mail a"), Strings{"part"});
+}
+
+TEST(RankingTest, PutsABetterPartBeforeAnApplication) {
+  MemoryIndex index;
+  index.Add("app", "Box of Mail");
+  index.Add("part", "Mailing", "", "", "app");
+  index.Add("repeated", "Seven", "seven letter letter", "", "app");
+  index.Add("once", "Eight", "eight letter");
+  EXPECT_EQ(index.Find("mail"), (Strings{"part", "app"}));
+  EXPECT_EQ(index.Find("letter"), (Strings{"repeated", "once"}));
+}
+
+TEST(RankingTest, PutsWhatIsSpeltAsItWasTypedFirst) {
+  MemoryIndex german("ger");
+  german.Add("with", "Zürich");
+  german.Add("without", "Zurich");
+  EXPECT_EQ(german.Find("zürich"), (Strings{"with", "without"}));
+  EXPECT_EQ(german.Find("zurich"), (Strings{"without", "with"}));
+  EXPECT_EQ(german.Find("zür"), (Strings{"with", "without"}));
+  EXPECT_EQ(german.Find("zur"), (Strings{"without", "with"}));
+
+  MemoryIndex turkish("trk");
+  turkish.Add("dotless", "Isı");
+  turkish.Add("dotted", "İsi");
+  EXPECT_EQ(turkish.Find("ısı"), (Strings{"dotless", "dotted"}));
+  EXPECT_EQ(turkish.Find("isi"), (Strings{"dotted", "dotless"}));
+
+  MemoryIndex japanese("jpn");
+  japanese.Add("katakana", "メモ");
+  japanese.Add("hiragana", "めも");
+  EXPECT_EQ(japanese.Find("メモ"), (Strings{"katakana", "hiragana"}));
+  EXPECT_EQ(japanese.Find("めも"), (Strings{"hiragana", "katakana"}));
+}
+
+TEST(RankingTest, AccentsCountLessThanThePlace) {
+  MemoryIndex index("fre");
+  index.Add("word beginning", "Un reseautage");
+  index.Add("word", "Mon réseau");
+  EXPECT_EQ(index.Find("reseau"), (Strings{"word", "word beginning"}));
+}
+
+TEST(RankingTest, PutsTheWordItselfBeforeItsOtherForms) {
+  MemoryIndex index;
+  index.Add("form", "One", "", "with a photo");
+  index.Add("itself", "Two", "", "with photos");
+  EXPECT_EQ(index.Find("photos"), (Strings{"itself", "form"}));
+}
+
+TEST(RankingTest, ScoresFallFromHitToHitAsWorthDoes) {
+  for (const Role role : {Role::kTitle, Role::kKeywords, Role::kBody}) {
+    EXPECT_GE(WorthOf(role, How::kWord), WorthOf(role, How::kStem));
+    EXPECT_GT(WorthOf(role, How::kWord), WorthOf(role, How::kBeginning));
+    EXPECT_GT(WorthOf(role, How::kBeginning), WorthOf(role, How::kInside));
+  }
+  EXPECT_GT(kWithoutAccents * WorthOf(Role::kTitle, How::kInside),
+            WorthOf(Role::kKeywords, How::kWord) * RepetitionFactor(1000000));
+  EXPECT_GT(kWithoutAccents * WorthOf(Role::kKeywords, How::kInside),
+            WorthOf(Role::kBody, How::kWord) + kApplicationWorth);
+  EXPECT_EQ(RepetitionFactor(0), RepetitionFactor(1));
+  EXPECT_EQ(RepetitionFactor(1), 1);
 }
 
 }  // namespace

@@ -88,7 +88,39 @@ TEST_F(RegistryTest, SetsADamagedFileAside) {
     EXPECT_NE(damage_.find(File()), std::string::npos) << damage_;
     EXPECT_FALSE(fs::exists(File()));
     EXPECT_EQ(Read(File() + ".damaged"), text);
+    fs::remove(File() + ".damaged");
   }
+}
+
+TEST_F(RegistryTest, SetsAsideWhateverIsInItsPlace) {
+  const Registry registry(File());
+  const auto expect_set_aside = [&](const std::string& cause) {
+    EXPECT_TRUE(registry.Load(damage_).empty());
+    EXPECT_NE(damage_.find(File()), std::string::npos) << damage_;
+    EXPECT_NE(damage_.find(cause), std::string::npos) << damage_;
+    EXPECT_FALSE(fs::exists(fs::symlink_status(File())));
+    registry.Save({});
+    EXPECT_TRUE(registry.Load(damage_).empty());
+    EXPECT_EQ(damage_, "");
+    fs::remove(File());
+  };
+  fs::create_directory(File());
+  expect_set_aside("cannot be read");
+  ASSERT_EQ(mkfifo(File().c_str(), 0600), 0);
+  expect_set_aside("cannot be read");
+  fs::create_symlink("indexes.json", File());
+  expect_set_aside("cannot be read");
+}
+
+TEST_F(RegistryTest, KeepsWhatWasSetAsideBefore) {
+  const Registry registry(File());
+  for (const char* text : {"{1", "{2", "{3"}) {
+    Write(text);
+    EXPECT_TRUE(registry.Load(damage_).empty());
+  }
+  EXPECT_EQ(Read(File() + ".damaged"), "{1");
+  EXPECT_EQ(Read(File() + ".damaged.2"), "{2");
+  EXPECT_EQ(Read(File() + ".damaged.3"), "{3");
 }
 
 TEST_F(RegistryTest, KeepsTheFileWhenItCannotBeReplaced) {

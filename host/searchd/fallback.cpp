@@ -1,0 +1,198 @@
+#include "host/searchd/fallback.h"
+
+#include <algorithm>
+#include <array>
+#include <functional>
+#include <set>
+#include <utility>
+
+#include "host/searchd/edit_distance.h"
+#include "host/searchd/folding.h"
+#include "host/searchd/terms.h"
+
+namespace searchd {
+namespace {
+
+// In shorter words one edit makes any word of any other. One letter may have been left out.
+constexpr std::size_t kLettersForTypo = 5;
+constexpr std::size_t kDenseLettersForTypo = 3;
+
+// What was typed, and what it may have been meant for.
+class Typed {
+ public:
+  explicit Typed(const std::string& text) : letters_(Letters(text)) {
+    const auto dense = [](char32_t c) { return IsDense(static_cast<UChar32>(c)); };
+    least_ = std::any_of(letters_.begin(), letters_.end(), dense) ? kDenseLettersForTypo
+                                                                  : kLettersForTypo;
+  }
+
+  // What this text is, begins or is in: as it is, or but for one edit.
+  Vocabulary::Wanted Begun() const {
+    return {letters_, 0, [this](const std::u32string& text) {
+              return text.compare(0, letters_.size(), letters_) == 0;
+            }};
+  }
+  Vocabulary::Wanted Holding() const {
+    return {letters_, 0, [this](const std::u32string& text) {
+              return text.find(letters_) != std::u32string::npos;
+            }};
+  }
+  Vocabulary::Wanted Near() const {
+    return {letters_, 1, [this](const std::u32string& text) {
+              return letters_.size() + 1 >= least_ && text.size() >= least_ &&
+                     IsWithinOneEdit(text, letters_);
+            }};
+  }
+  Vocabulary::Wanted NearlyBegun() const {
+    return {letters_, 1, [this](const std::u32string& text) {
+              return letters_.size() >= least_ && BeginsWithinOneEdit(text, letters_);
+            }};
+  }
+  Vocabulary::Wanted NearlyHolding() const {
+    return {letters_, 1, [this](const std::u32string& text) {
+              return letters_.size() >= least_ && ContainsWithinOneEdit(text, letters_);
+            }};
+  }
+
+ private:
+  std::u32string letters_;
+  std::size_t least_;
+};
+
+std::size_t CountWays(const Plan& plan) {
+  std::size_t count = plan.whole.size();
+  for (const Reading* reading : {&plan.parts, &plan.words}) {
+    for (const Clause& clause : *reading) count += clause.ways.size();
+  }
+  return count;
+}
+
+bool HasWords(const Field& field) {
+  return !field.rule.ngram && field.rule.analyzer != AnalyzerKind::kKeyword;
+}
+
+void AddWays(std::vector<Way>& ways, const Field& field, How how, double worth, bool beginning,
+             const std::vector<std::string>& terms) {
+  if (worth <= 0) return;
+  for (const std::string& term : terms) {
+    ways.push_back({field.member, field.role, how, worth, {{term, beginning}}});
+  }
+}
+
+// Calls `add` with each clause of a reading and each field of words, and the clause's text as it
+// stands in that field's terms.
+void ForEachWord(Reading& reading, const std::vector<Field>& fields, Analyzer& analyzer,
+                 const std::function<void(Clause&, std::size_t, const Word&)>& add) {
+  for (Clause& clause : reading) {
+    for (std::size_t i = 0; i < fields.size(); ++i) {
+      if (!HasWords(fields[i])) continue;
+      const std::vector<Word> words = analyzer.Words(fields[i].rule, clause.text);
+      if (words.size() == 1 && !words[0].bare.empty()) add(clause, i, words[0]);
+    }
+  }
+}
+
+// Stems of which the typed word may become another form with one of the usual endings, for words
+// that are not in the index.
+std::vector<std::string> StemsWithEndings(const Field& field, const Analyzer& analyzer,
+                                          const std::string& word) {
+  constexpr std::array<const char*, 16> kEndings = {"s",  "es", "e",  "n",   "en",  "er", "r", "k",
+                                                    "ok", "ek", "ar", "lar", "ler", "ы",  "и", "й"};
+  if (field.role == Role::kBody || field.absent.count(Space::kStems) != 0) return {};
+  std::set<std::string> terms;
+  for (const char* ending : kEndings) {
+    for (const std::string& stem : analyzer.Stems(analyzer.WholeText(word + ending))) {
+      terms.insert(WordTerm(FieldPrefix(field.member, Space::kStems), stem));
+    }
+  }
+  return {terms.begin(), terms.end()};
+}
+
+void AddNearWords(Reading& reading, const std::vector<Field>& fields, Analyzer& analyzer,
+                  const Vocabulary& vocabulary) {
+  ForEachWord(reading, fields, analyzer, [&](Clause& clause, std::size_t i, const Word& word) {
+    const Typed typed(word.plain);
+    const Field& field = fields[i];
+    AddWays(clause.ways, field, How::kTypo, kWithTypo * WorthOf(field.role, How::kWord), false,
+            vocabulary.FindWords(i, typed.Near()));
+    if (&clause != &reading.back()) return;
+    AddWays(clause.ways, field, How::kTypo, kWithTypo * WorthOf(field.role, How::kBeginning), false,
+            vocabulary.FindWords(i, typed.NearlyBegun()));
+    AddWays(clause.ways, field, How::kTypo, kUnfinishedWorth, false,
+            StemsWithEndings(field, analyzer, word.raw));
+  });
+}
+
+// Titles that are nearly, begin nearly or hold nearly what was typed, and those that begin with it
+// or hold it when spaces do not count.
+void AddNearTitles(std::vector<Way>& ways, const Field& field, const Typed& typed,
+                   const Vocabulary& vocabulary) {
+  const auto add = [&](double worth, const Vocabulary::Wanted& wanted) {
+    AddWays(ways, field, How::kTypo, worth, false, vocabulary.FindTitles(wanted));
+  };
+  add(kWithTypo * WorthOf(field.role, How::kWholeText), typed.Near());
+  add(WorthOf(field.role, How::kBeginning), typed.Begun());
+  add(kWithTypo * WorthOf(field.role, How::kBeginning), typed.NearlyBegun());
+  add(kWithTypo * WorthOf(field.role, How::kInside), typed.Holding());
+  add(kWithTypo * WorthOf(field.role, How::kInside), typed.NearlyHolding());
+}
+
+}  // namespace
+
+bool AddMarkless(Plan& plan, const std::vector<Field>& fields, Analyzer& analyzer) {
+  const std::size_t before = CountWays(plan);
+  ForEachWord(plan.parts, fields, analyzer, [&](Clause& clause, std::size_t i, const Word& word) {
+    const Field& field = fields[i];
+    for (const Space space : {Space::kWords, Space::kPlainWords, Space::kBareWords}) {
+      if (word.bare == word.plain && space != Space::kBareWords) continue;
+      if (field.absent.count(space) != 0) continue;
+      const std::string prefix = FieldPrefix(field.member, space);
+      AddWays(clause.ways, field, How::kWord, kWithoutMarks * WorthOf(field.role, How::kWord),
+              false, {WordTerm(prefix, word.bare)});
+      if (&clause != &plan.parts.back()) continue;
+      AddWays(clause.ways, field, How::kBeginning,
+              kWithoutMarks * WorthOf(field.role, How::kBeginning), true,
+              {WordTermBeginning(prefix, word.bare)});
+    }
+  });
+  const Word whole = analyzer.WholeText(plan.text);
+  for (const Field& field : fields) {
+    if (whole.bare.empty()) break;
+    if (field.role != Role::kTitle || field.absent.count(Space::kBareWords) != 0) continue;
+    for (const char* prefix : {kTitlePrefix, kPlainTitlePrefix, kBareTitlePrefix}) {
+      AddWays(plan.whole, field, How::kWholeText,
+              kWithoutMarks * WorthOf(field.role, How::kWholeText), false,
+              {WordTerm(prefix, whole.bare)});
+      AddWays(plan.whole, field, How::kWholeBeginning,
+              kWithoutMarks * WorthOf(field.role, How::kWholeBeginning), true,
+              {WordTermBeginning(prefix, whole.bare)});
+    }
+  }
+  return CountWays(plan) > before;
+}
+
+bool AddContaining(Plan& plan, const std::vector<Field>& fields, Analyzer& analyzer,
+                   const Vocabulary& vocabulary) {
+  const std::size_t before = CountWays(plan);
+  ForEachWord(plan.parts, fields, analyzer, [&](Clause& clause, std::size_t i, const Word& word) {
+    const Typed typed(word.plain);
+    AddWays(clause.ways, fields[i], How::kInside, WorthOf(fields[i].role, How::kInside), false,
+            vocabulary.FindWords(i, typed.Holding()));
+  });
+  return CountWays(plan) > before;
+}
+
+bool AddNearly(Plan& plan, const std::vector<Field>& fields, Analyzer& analyzer,
+               const Vocabulary& vocabulary) {
+  const std::size_t before = CountWays(plan);
+  AddNearWords(plan.parts, fields, analyzer, vocabulary);
+  AddNearWords(plan.words, fields, analyzer, vocabulary);
+  const std::string skeleton = analyzer.Skeleton(plan.text);
+  for (const Field& field : fields) {
+    if (skeleton.empty() || field.role != Role::kTitle) continue;
+    AddNearTitles(plan.whole, field, Typed(skeleton), vocabulary);
+  }
+  return CountWays(plan) > before;
+}
+
+}  // namespace searchd

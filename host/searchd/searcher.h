@@ -1,0 +1,50 @@
+// Carrying out a search on an open database.
+#pragma once
+
+#include <xapian.h>
+
+#include <memory>
+#include <string>
+#include <vector>
+
+#include "host/searchd/analyzer.h"
+#include "host/searchd/mapping.h"
+#include "host/searchd/planner.h"
+#include "host/searchd/vocabulary.h"
+
+namespace searchd {
+
+struct SearchRequest {
+  std::string query;
+  unsigned offset = 0;
+  unsigned limit = 0;
+  bool explain = false;
+};
+
+struct SearchResult {
+  Xapian::doccount total = 0;
+  std::string hits = "[]";  // a JSON text
+  std::string matched;      // by which step the hits were found; empty without hits
+  bool cut = false;         // the query was longer than is looked at
+};
+
+// One thread at a time. Throws what Xapian throws.
+class Searcher {
+ public:
+  Searcher(const Mapping& mapping, const Language& language);
+
+  SearchResult Search(const Xapian::Database& database, const SearchRequest& request);
+
+  // To be called when the database is another one than before, or in another state.
+  void Forget();
+
+ private:
+  Xapian::MSet FindByAnyStep(const Xapian::Database& database, Plan& plan, unsigned limit);
+
+  Analyzer analyzer_;
+  std::vector<Field> fields_;
+  bool knows_fields_ = false;
+  std::unique_ptr<Vocabulary> vocabulary_;  // read when first needed
+};
+
+}  // namespace searchd

@@ -1,0 +1,98 @@
+#include "host/searchd/vocabulary.h"
+
+#include <unicode/uchar.h>
+#include <unicode/unistr.h>
+
+#include <algorithm>
+#include <bitset>
+#include <cstdint>
+#include <utility>
+
+#include "host/searchd/terms.h"
+
+namespace searchd {
+namespace {
+
+// More terms than this are not asked for in place of one that was typed.
+constexpr std::size_t kMaxFound = 200;
+
+constexpr std::uint32_t kNotACharacter = 0x80000000;
+
+bool IsMark(UChar32 c) { return (U_GET_GC_MASK(c) & U_GC_M_MASK) != 0; }
+
+// A letter with marks, as a number that is no character's.
+char32_t WithMark(char32_t letter, UChar32 mark) {
+  constexpr std::uint32_t kPrime = 0x01000193;
+  return static_cast<char32_t>(((letter ^ static_cast<std::uint32_t>(mark)) * kPrime) |
+                               kNotACharacter);
+}
+
+// A bit for each letter; several letters may share one.
+std::uint64_t Summary(const std::u32string& letters) {
+  constexpr std::uint32_t kSpread = 0x9E3779B1;
+  std::uint64_t summary = 0;
+  for (const char32_t letter : letters) {
+    summary |= std::uint64_t{1} << ((static_cast<std::uint32_t>(letter) * kSpread) >> 26U);
+  }
+  return summary;
+}
+
+bool IsAscii(const std::string& text) {
+  return std::all_of(text.begin(), text.end(), [](char c) { return (c & 0x80) == 0; });
+}
+
+}  // namespace
+
+std::u32string Letters(const std::string& utf8) {
+  if (IsAscii(utf8)) return {utf8.begin(), utf8.end()};
+  const icu::UnicodeString text = icu::UnicodeString::fromUTF8(utf8);
+  std::u32string letters;
+  for (int32_t i = 0; i < text.length(); i = text.moveIndex32(i, 1)) {
+    const UChar32 c = text.char32At(i);
+    if (IsMark(c) && !letters.empty()) {
+      letters.back() = WithMark(letters.back(), c);
+    } else {
+      letters.push_back(static_cast<char32_t>(c));
+    }
+  }
+  return letters;
+}
+
+Vocabulary::Vocabulary(const Xapian::Database& database, const std::vector<Field>& fields) {
+  titles_.Read(database, kSkeletonPrefix);
+  for (const Field& field : fields) {
+    Shelf words;
+    words.Read(database, FieldPrefix(field.member, Space::kWords));
+    words.Read(database, FieldPrefix(field.member, Space::kPlainWords));
+    words_.push_back(std::move(words));
+  }
+}
+
+std::vector<std::string> Vocabulary::FindWords(std::size_t field, const Wanted& wanted) const {
+  return words_[field].Find(wanted);
+}
+
+std::vector<std::string> Vocabulary::FindTitles(const Wanted& wanted) const {
+  return titles_.Find(wanted);
+}
+
+void Vocabulary::Shelf::Read(const Xapian::Database& database, const std::string& prefix) {
+  for (auto term = database.allterms_begin(prefix); term != database.allterms_end(prefix); ++term) {
+    terms_.push_back(*term);
+    letters_.push_back(Letters(terms_.back().substr(prefix.size())));
+    summaries_.push_back(Summary(letters_.back()));
+  }
+}
+
+std::vector<std::string> Vocabulary::Shelf::Find(const Wanted& wanted) const {
+  const std::uint64_t needed = Summary(wanted.some_of);
+  const auto most_lacking = static_cast<std::size_t>(wanted.but_for);
+  std::vector<std::string> found;
+  for (std::size_t i = 0; i < terms_.size() && found.size() < kMaxFound; ++i) {
+    const std::bitset<64> lacking(needed & ~summaries_[i]);
+    if (lacking.count() <= most_lacking && wanted.accept(letters_[i])) found.push_back(terms_[i]);
+  }
+  return found;
+}
+
+}  // namespace searchd

@@ -1,0 +1,172 @@
+#include "host/searchd/index.h"
+
+#include <fcntl.h>
+#include <gtest/gtest.h>
+#include <unistd.h>
+
+#include <filesystem>
+#include <functional>
+#include <string>
+
+#include "host/searchd/json_text.h"
+#include "host/searchd/request_error.h"
+#include "tests/support/device_root_test.h"
+
+namespace searchd {
+namespace {
+
+namespace fs = std::filesystem;
+
+constexpr char kPath[] = "/var/packages/Velkor/etc/indexes/enu";
+constexpr char kBackup[] = "/tmp/backup";
+
+class IndexTest : public test::DeviceRootTest {
+ protected:
+  IndexTest() {
+    PrepareIndexDirectory(kPath, false);
+    index_ = std::make_unique<Index>(
+        IndexDefinition{"appindex_enu", kPath, ParseJson(R"({"property_id":"id"})")}, checks_,
+        DatabaseCheck::Files::kMade);
+  }
+
+  static std::string File(const std::string& name) { return std::string(kPath) + "/" + name; }
+
+  void Upsert(const std::string& id) {
+    const Json::Value document = ParseJson(R"({"id":")" + id + R"("})");
+    index_->Upsert(id, document, 100);
+  }
+
+  // As the daemon does when no request comes for a moment: changes are on their way to the files.
+  void UpsertMany() {
+    for (int i = 0; i < 100; ++i) Upsert("new" + std::to_string(i));
+    while (index_->HasWork()) index_->DoWork();
+  }
+
+  // What `call` fails with; fails the test when it does not.
+  static RequestError FailureOf(const std::function<void()>& call) {
+    try {
+      call();
+    } catch (const RequestError& e) {
+      return e;
+    }
+    ADD_FAILURE() << "nothing failed";
+    return {Code::kRejected, ""};
+  }
+
+  CheckProcess checks_{STDERR_FILENO};
+  std::unique_ptr<Index> index_;
+};
+
+TEST_F(IndexTest, KeepsUncommittedChangesOverAReopening) {
+  UpsertMany();
+  index_->Reopen();
+  EXPECT_EQ(index_->DocumentCount(), 0U);
+  index_->Commit();
+  EXPECT_EQ(index_->DocumentCount(), 100U);
+  Upsert("one more");
+  index_->Commit();
+  EXPECT_EQ(index_->DocumentCount(), 101U);
+}
+
+TEST_F(IndexTest, SeesFilesThatSomebodyHasReplaced) {
+  Upsert("old");
+  index_->Commit();
+  fs::copy(kPath, kBackup);
+  UpsertMany();
+  index_->Commit();
+  EXPECT_EQ(index_->DocumentCount(), 101U);
+  fs::remove_all(kPath);
+  fs::copy(kBackup, kPath);
+  EXPECT_EQ(index_->DocumentCount(), 1U);
+  Upsert("new");
+  index_->Commit();
+  EXPECT_EQ(index_->DocumentCount(), 2U);
+}
+
+TEST_F(IndexTest, GivesUpUncommittedChangesToReplacedFilesAndSaysSoOnce) {
+  Upsert("old");
+  index_->Commit();
+  fs::copy(kPath, kBackup);
+  UpsertMany();
+  fs::remove_all(kPath);
+  fs::copy(kBackup, kPath);
+  const RequestError failure = FailureOf([&] { index_->Commit(); });
+  EXPECT_EQ(failure.GetCode(), Code::kStorage);
+  EXPECT_NE(std::string(failure.what()).find(kPath), std::string::npos) << failure.what();
+  EXPECT_EQ(index_->DocumentCount(), 1U);
+  Upsert("new");
+  index_->Commit();
+  EXPECT_EQ(index_->DocumentCount(), 2U);
+}
+
+TEST_F(IndexTest, NeverCommitsOverDamage) {
+  for (const char* name : {"iamglass", "postlist.glass", "docdata.glass", "termlist.glass"}) {
+    Upsert("old");
+    index_->Commit();
+    UpsertMany();
+    fs::resize_file(File(name), fs::file_size(File(name)) / 3);
+    for (int i = 0; i < 2; ++i) {
+      const RequestError failure = FailureOf([&] { index_->Commit(); });
+      EXPECT_EQ(failure.GetCode(), Code::kStorage) << name;
+      EXPECT_NE(std::string(failure.what()).find(File(name)), std::string::npos) << failure.what();
+    }
+    EXPECT_EQ(FailureOf([&] { Upsert("new"); }).GetCode(), Code::kStorage) << name;
+    EXPECT_EQ(FailureOf([&] { index_->DocumentCount(); }).GetCode(), Code::kStorage) << name;
+    index_->Close();
+    PrepareIndexDirectory(kPath, true);
+    const IndexDefinition definition = index_->Definition();
+    index_ = std::make_unique<Index>(definition, checks_, DatabaseCheck::Files::kMade);
+  }
+}
+
+TEST_F(IndexTest, NeverCommitsThroughALink) {
+  Upsert("old");
+  index_->Commit();
+  UpsertMany();
+  fs::rename(kPath, "/tmp/elsewhere");
+  fs::create_directory_symlink("/tmp/elsewhere", kPath);
+  const fs::file_time_type before = fs::last_write_time("/tmp/elsewhere");
+  EXPECT_EQ(FailureOf([&] { index_->Commit(); }).GetCode(), Code::kStorage);
+  EXPECT_EQ(fs::last_write_time("/tmp/elsewhere"), before);
+}
+
+// Another process that has the index open for writing.
+class Holder {
+ public:
+  Holder() : fd_(open(File().c_str(), O_RDWR | O_CREAT | O_CLOEXEC, 0600)) {
+    struct flock lock {};
+    lock.l_type = F_WRLCK;
+    lock.l_len = 1;
+    if (fcntl(fd_, F_OFD_SETLK, &lock) != 0) ADD_FAILURE() << "cannot lock " << File();
+  }
+  ~Holder() { close(fd_); }
+  Holder(const Holder&) = delete;
+  Holder& operator=(const Holder&) = delete;
+
+ private:
+  static std::string File() { return std::string(kPath) + "/flintlock"; }
+
+  int fd_;
+};
+
+TEST_F(IndexTest, LosesNothingWhileAnotherProcessHoldsIt) {
+  {
+    const Holder holder;
+    Upsert("one");
+    EXPECT_EQ(FailureOf([&] { index_->Commit(); }).GetCode(), Code::kBusy);
+    index_->DoWork();
+    EXPECT_FALSE(index_->HasWork()) << "it must not be tried again without end";
+    Upsert("two");
+    EXPECT_EQ(FailureOf([&] { index_->Commit(); }).GetCode(), Code::kBusy);
+    const RequestError failure = FailureOf([&] {
+      for (int i = 0; i < 1000; ++i) Upsert("many" + std::to_string(i));
+    });
+    EXPECT_EQ(failure.GetCode(), Code::kBusy) << "what waits must have an end";
+  }
+  index_->Commit();
+  EXPECT_GE(index_->DocumentCount(), 3U);
+  EXPECT_LT(index_->DocumentCount(), 1000U);
+}
+
+}  // namespace
+}  // namespace searchd
