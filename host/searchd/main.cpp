@@ -62,7 +62,7 @@ void Serve(const Options& options, int activated, int output, Started started) {
 
 void Start(const Options& options) {
   LoadFolding();
-  KeepToOneHeap();
+  ShareHeaps();
   const int activated = TakeActivatedSocket();
   const int background_fd = options.foreground ? -1 : GoToBackground();
   const host::sdk::UniqueFd null(open("/dev/null", O_RDWR | O_CLOEXEC));

@@ -159,7 +159,7 @@ int CatchSignals() {
   return fd;
 }
 
-void KeepToOneHeap() { mallopt(M_ARENA_MAX, 1); }
+void ShareHeaps() { mallopt(M_ARENA_MAX, 2); }
 
 void RaiseDescriptorLimit() {
   rlimit limit{};

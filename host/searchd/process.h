@@ -59,9 +59,10 @@ class SocketFile {
 // beyond a limit on file sizes fails without a signal.
 int CatchSignals();
 
-// Lets all threads take memory from one heap: each with its own, they would hold on to several
-// times what they use. Call it before any thread is started.
-void KeepToOneHeap();
+// Gives the first thread a heap, and the others one together: each with its own, they would hold on
+// to several times what they use, and with the first one's they would slow down its quick answers.
+// Call it before any thread is started.
+void ShareHeaps();
 
 // As many descriptors as the system allows: each open index holds several.
 void RaiseDescriptorLimit();
