@@ -217,4 +217,15 @@ std::vector<std::string> DenseRuns(const std::string& folded) {
   return runs;
 }
 
+std::vector<Word> DenseRuns(const Word& text) {
+  const std::vector<std::string> raw = DenseRuns(text.raw);
+  const std::vector<std::string> plain = DenseRuns(text.plain);
+  std::vector<Word> runs;
+  // There are as many of both, as accents stand within a run or outside of all.
+  for (std::size_t i = 0; i < std::min(raw.size(), plain.size()); ++i) {
+    runs.push_back({raw[i], plain[i], {}});
+  }
+  return runs;
+}
+
 }  // namespace searchd

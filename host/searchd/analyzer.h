@@ -81,4 +81,7 @@ std::vector<std::string> SplitWhiteSpace(const std::string& text);
 // The longest parts of a folded text that are in a script without spaces.
 std::vector<std::string> DenseRuns(const std::string& folded);
 
+// The same of a text with its form without accents; `bare` is left empty.
+std::vector<Word> DenseRuns(const Word& text);
+
 }  // namespace searchd

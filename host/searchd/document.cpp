@@ -67,10 +67,9 @@ class TermAdder {
       if (i == 0 || PhraseWorth(role) == 0) continue;
       Add(FieldPrefix(member, Space::kPairs), Pair(words[i - 1].plain, words[i].plain));
     }
-    const Word whole = analyzer_.WholeText(text);
-    const std::vector<std::string> runs = DenseRuns(whole.raw);
-    const std::vector<std::string> plain_runs = DenseRuns(whole.plain);
-    for (std::size_t i = 0; i < runs.size(); ++i) AddGrams(member, role, runs[i], plain_runs[i]);
+    for (const Word& run : DenseRuns(analyzer_.WholeText(text))) {
+      AddGrams(member, role, run.raw, run.plain);
+    }
   }
 
   void AddGrams(const std::string& member, Role role, const std::string& raw,

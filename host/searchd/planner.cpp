@@ -146,15 +146,12 @@ class Planner {
   // Where the dictionary may not part what was typed as it parted the text.
   static void AddRuns(std::vector<Way>& ways, const Field& field, const std::vector<Word>& words,
                       const Word& part) {
-    const std::vector<std::string> runs = DenseRuns(part.raw);
-    const std::vector<std::string> plain_runs = DenseRuns(part.plain);
-    std::vector<Word> parts;
-    for (std::size_t i = 0; i < runs.size(); ++i) parts.push_back({runs[i], plain_runs[i], {}});
+    const std::vector<Word> runs = DenseRuns(part);
     std::vector<Word> others;
     for (const Word& word : words) {
       if (DenseRuns(word.raw).empty()) others.push_back(word);
     }
-    if (!parts.empty()) AddInside(ways, field, parts, others);
+    if (!runs.empty()) AddInside(ways, field, runs, others);
   }
 
   // All of `parts` inside the field's texts, and all of `words` among its words.
