@@ -105,7 +105,7 @@ std::vector<Word> Analyzer::WhiteSpaceWords(const UnicodeString& text, bool fold
 }
 
 std::vector<std::string> Analyzer::Stems(const Word& word) const {
-  if (stem_.is_none()) return {};
+  if (stem_.is_none() || !DenseCharacters(word.raw).empty()) return {};
   // Stemmers look for accents, and people leave them out.
   std::vector<std::string> stems = {
       ToUtf8(WithoutAccents(FromUtf8(stem_(word.raw)))),

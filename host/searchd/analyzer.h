@@ -30,7 +30,8 @@ class Analyzer {
   // The words of a text under a field's rule, before a step "ngram", in the order of the text.
   std::vector<Word> Words(const FieldRule& rule, const std::string& text);
 
-  // The stems of a word, without accents; none where the language has no stemmer.
+  // The stems of a word, without accents; none where the language has no stemmer, and none of words
+  // in a script without spaces.
   std::vector<std::string> Stems(const Word& word) const;
 
   // A whole text as one folded word with single spaces, to compare titles with.
@@ -55,9 +56,9 @@ class Analyzer {
 // How many characters a text of UTF-8 has.
 std::size_t CountCharacters(const std::string& text);
 
-// What a text begins with, up to three characters: what is typed first is looked up as a term, and
+// What a text begins with, one and two characters: what is typed first is looked up as a term, and
 // not in all the terms that begin so.
-constexpr std::size_t kMaxBeginning = 3;
+constexpr std::size_t kMaxBeginning = 2;
 std::vector<std::string> Beginnings(const std::string& text);
 
 // The n-grams of a word: for each of its characters, what begins with it, `least` to `most`

@@ -1,5 +1,6 @@
 #include "host/searchd/common_words.h"
 
+#include <algorithm>
 #include <set>
 #include <string>
 #include <utility>
@@ -48,6 +49,17 @@ const std::set<std::string>& PlainCommonWords() {
   return words;
 }
 
+// Those that are written without spaces around them.
+const std::vector<std::string>& DenseCommonWords() {
+  static const std::vector<std::string> words = [] {
+    std::vector<std::string> dense = CommonWords();
+    const auto is_parted = [](const std::string& word) { return DenseCharacters(word).empty(); };
+    dense.erase(std::remove_if(dense.begin(), dense.end(), is_parted), dense.end());
+    return dense;
+  }();
+  return words;
+}
+
 bool StandsInHalfOfTheTitles(const Word& word, const std::vector<Field>& fields,
                              const Xapian::Database& database) {
   const Xapian::doccount documents = database.get_doccount();
@@ -77,8 +89,8 @@ std::vector<std::string> PartCommonWords(const std::string& text) {
   for (const std::string& part : SplitWhiteSpace(text)) {
     std::string rest = part;
     std::string behind;
-    for (const std::string& word : CommonWords()) {
-      if (DenseCharacters(word).empty() || rest.size() <= word.size()) continue;
+    for (const std::string& word : DenseCommonWords()) {
+      if (rest.size() <= word.size()) continue;
       if (rest.compare(0, word.size(), word) == 0) {
         parts.push_back(word);
         rest.erase(0, word.size());

@@ -22,8 +22,10 @@ class TermAdder {
   TermAdder(Xapian::Document& document, Analyzer& analyzer)
       : document_(document), analyzer_(analyzer) {}
 
+  // `has_grams` says that another member gives all n-grams of the same text.
   void AddMember(const std::string& member, const FieldRule& rule, const std::string& name,
-                 const std::string& text) {
+                 const std::string& text, bool has_grams) {
+    if (!rule.in_all) return;
     const std::vector<Word> words = analyzer_.Words(rule, text);
     const Role role = RoleOf(name, rule);
     if (rule.ngram) {
@@ -36,8 +38,7 @@ class TermAdder {
       if (behind.empty() || rule.analyzer != AnalyzerKind::kStandard) continue;
       for (const Word& other : analyzer_.Words(rule, behind)) AddWord(member, role, other);
     }
-    if (rule.analyzer == AnalyzerKind::kStandard) AddStandard(member, role, words, text);
-    if (!rule.in_all) return;
+    if (rule.analyzer == AnalyzerKind::kStandard) AddStandard(member, role, words, text, has_grams);
     if (role == Role::kTitle) AddTitle(text);
     if (role == Role::kKeywords) AddName(text);
   }
@@ -59,14 +60,15 @@ class TermAdder {
   }
 
   void AddStandard(const std::string& member, Role role, const std::vector<Word>& words,
-                   const std::string& text) {
+                   const std::string& text, bool has_grams) {
     for (std::size_t i = 0; i < words.size(); ++i) {
       for (const std::string& stem : analyzer_.Stems(words[i])) {
-        Add(FieldPrefix(member, Space::kStems), stem);
+        if (stem != words[i].raw) Add(FieldPrefix(member, Space::kStems), stem);
       }
       if (i == 0 || PhraseWorth(role) == 0) continue;
       Add(FieldPrefix(member, Space::kPairs), Pair(words[i - 1].plain, words[i].plain));
     }
+    if (has_grams) return;
     for (const Word& run : DenseRuns(analyzer_.WholeText(text))) {
       AddGrams(member, role, run.raw, run.plain);
     }
@@ -126,6 +128,15 @@ class TermAdder {
   Analyzer& analyzer_;
 };
 
+// Whether a member that is there to be found by any part of it holds this text.
+bool IsTextForParts(const Mapping& mapping, const Json::Value& data, const std::string& text) {
+  for (auto it = data.begin(); it != data.end(); ++it) {
+    const FieldRule& rule = mapping.RuleOf(it.name());
+    if (rule.ngram && rule.in_all && *it == text) return true;
+  }
+  return false;
+}
+
 // A part of an application names it as its owner.
 bool IsApplication(const Mapping& mapping, const Json::Value& data) {
   return mapping.Fields().count("owner") != 0 && data.get("owner", "").asString().empty();
@@ -169,7 +180,8 @@ Xapian::Document BuildDocument(const Mapping& mapping, Analyzer& analyzer,
     const std::string name = it.name();
     const FieldRule& rule = mapping.RuleOf(name);
     const bool named = mapping.Fields().count(name) != 0;
-    adder.AddMember(named ? name : "", rule, name, it->asString());
+    adder.AddMember(named ? name : "", rule, name, it->asString(),
+                    IsTextForParts(mapping, data, it->asString()));
     if (rule.stored && IsShownInHits(name)) stored[name] = *it;
   }
   if (IsApplication(mapping, data)) document.add_boolean_term(kApplicationTerm);

@@ -28,28 +28,28 @@ class Typed {
 
   // What this text is, begins or is in: as it is, or but for one edit.
   Vocabulary::Wanted Begun() const {
-    return {letters_, 0, [this](const std::u32string& text) {
+    return {letters_, false, [this](const std::u32string& text) {
               return text.compare(0, letters_.size(), letters_) == 0;
             }};
   }
   Vocabulary::Wanted Holding() const {
-    return {letters_, 0, [this](const std::u32string& text) {
+    return {letters_, false, [this](const std::u32string& text) {
               return text.find(letters_) != std::u32string::npos;
             }};
   }
   Vocabulary::Wanted Near() const {
-    return {letters_, 1, [this](const std::u32string& text) {
+    return {letters_, true, [this](const std::u32string& text) {
               return letters_.size() + 1 >= least_ && text.size() >= least_ &&
                      IsWithinOneEdit(text, letters_);
             }};
   }
   Vocabulary::Wanted NearlyBegun() const {
-    return {letters_, 1, [this](const std::u32string& text) {
+    return {letters_, true, [this](const std::u32string& text) {
               return letters_.size() >= least_ && BeginsWithinOneEdit(text, letters_);
             }};
   }
   Vocabulary::Wanted NearlyHolding() const {
-    return {letters_, 1, [this](const std::u32string& text) {
+    return {letters_, true, [this](const std::u32string& text) {
               return letters_.size() >= least_ && ContainsWithinOneEdit(text, letters_);
             }};
   }
@@ -98,11 +98,11 @@ std::vector<std::string> StemsWithEndings(const Field& field, const Analyzer& an
                                           const std::string& word) {
   constexpr std::array<const char*, 16> kEndings = {"s",  "es", "e",  "n",   "en",  "er", "r", "k",
                                                     "ok", "ek", "ar", "lar", "ler", "ы",  "и", "й"};
-  if (field.role == Role::kBody || field.absent.count(Space::kStems) != 0) return {};
+  if (field.role == Role::kBody) return {};
   std::set<std::string> terms;
   for (const char* ending : kEndings) {
     for (const std::string& stem : analyzer.Stems(analyzer.WholeText(word + ending))) {
-      terms.insert(WordTerm(FieldPrefix(field.member, Space::kStems), stem));
+      for (std::string& term : StemTerms(field, stem)) terms.insert(std::move(term));
     }
   }
   return {terms.begin(), terms.end()};

@@ -43,4 +43,16 @@ struct Plan {
   bool IsEmpty() const { return whole.empty() && parts.empty() && words.empty(); }
 };
 
+// A reading, and in which members it counts. Words that are found in one member's texts are worth
+// more than words from all over the document.
+struct View {
+  const Reading* reading;
+  bool (*counts)(Role role);
+  double factor;  // of what the reading is worth
+};
+
+bool IsAny(Role role);
+
+std::vector<View> ViewsOf(const Plan& plan);
+
 }  // namespace searchd

@@ -121,10 +121,11 @@ class Planner {
     for (const Form& form : Forms(words, Has(field, Space::kPlainWords))) {
       AddForm(ways, field, words, form, last);
     }
-    if (words.size() > 1 || !Has(field, Space::kStems)) return;
-    const std::string prefix = FieldPrefix(field.member, Space::kStems);
+    if (words.size() > 1) return;
     for (const std::string& stem : analyzer_.Stems(words[0])) {
-      Add(ways, field, How::kStem, WorthOf(field.role, How::kStem), {{WordTerm(prefix, stem)}});
+      for (const std::string& term : StemTerms(field, stem)) {
+        Add(ways, field, How::kStem, WorthOf(field.role, How::kStem), {{term}});
+      }
     }
   }
 
@@ -264,6 +265,15 @@ Reading Read(Planner& planner, ClauseMaker make, const std::vector<std::string>&
 
 }  // namespace
 
+std::vector<std::string> StemTerms(const Field& field, const std::string& stem) {
+  std::vector<std::string> terms;
+  for (const Space space : {Space::kStems, Space::kWords}) {
+    if (field.absent.count(space) != 0) continue;
+    terms.push_back(WordTerm(FieldPrefix(field.member, space), stem));
+  }
+  return terms;
+}
+
 std::vector<Field> SearchedFields(const Mapping& mapping) {
   std::vector<Field> fields;
   const auto add = [&](const std::string& member, const FieldRule& rule) {
@@ -295,7 +305,7 @@ void AddUnfinishedForms(Plan& plan, const std::vector<Field>& fields, Analyzer& 
   const std::string word = analyzer.WholeText(last.text).raw;
   if (CountCharacters(word) < kLeastCharacters) return;
   for (const Field& field : fields) {
-    if (field.role == Role::kBody || field.absent.count(Space::kStems) != 0) continue;
+    if (field.role == Role::kBody) continue;
     const std::string prefix = FieldPrefix(field.member, Space::kWords);
     const std::string beginning = WordTermBeginning(prefix, word);
     std::set<std::string> stems;
@@ -305,11 +315,9 @@ void AddUnfinishedForms(Plan& plan, const std::vector<Field>& fields, Analyzer& 
       for (std::string& stem : analyzer.Stems(known)) stems.insert(std::move(stem));
     }
     for (const std::string& stem : stems) {
-      last.ways.push_back({field.member,
-                           field.role,
-                           How::kStem,
-                           kUnfinishedWorth,
-                           {{WordTerm(FieldPrefix(field.member, Space::kStems), stem)}}});
+      for (const std::string& found : StemTerms(field, stem)) {
+        last.ways.push_back({field.member, field.role, How::kStem, kUnfinishedWorth, {{found}}});
+      }
     }
   }
 }

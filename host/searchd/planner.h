@@ -30,6 +30,9 @@ std::vector<Field> SearchedFields(const Mapping& mapping);
 // Finds out what is absent in a database.
 void FindAbsent(std::vector<Field>& fields, const Xapian::Database& database);
 
+// The terms of words with a stem. A word that is its own stem has no other term for it.
+std::vector<std::string> StemTerms(const Field& field, const std::string& stem);
+
 // Adds to a plan the other forms of the words that its last word may become, as far as the database
 // knows such words.
 void AddUnfinishedForms(Plan& plan, const std::vector<Field>& fields, Analyzer& analyzer,

@@ -119,11 +119,4 @@ double RepetitionFactor(Xapian::termcount count) {
   return 1 + kRepetition * repeated / (repeated + 4);
 }
 
-double WorthWeight::get_sumpart(Xapian::termcount count, Xapian::termcount,
-                                Xapian::termcount) const {
-  return worth_ * RepetitionFactor(count);
-}
-
-double WorthWeight::get_maxpart() const { return worth_ * (1 + kRepetition); }
-
 }  // namespace searchd

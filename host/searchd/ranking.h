@@ -64,24 +64,8 @@ constexpr double kNameBeginningWorth = 38;
 // between two ways to find a word.
 constexpr double kApplicationWorth = 0.1;
 
-// Gives a term the worth it is scaled to, and up to a tenth more when it stands in the document
-// more than once. No worth reaches the next higher one by that.
-class WorthWeight : public Xapian::Weight {
- public:
-  WorthWeight() { need_stat(WDF); }
-  WorthWeight* clone() const override { return new WorthWeight; }
-  double get_sumpart(Xapian::termcount count, Xapian::termcount, Xapian::termcount) const override;
-  double get_maxpart() const override;
-  double get_sumextra(Xapian::termcount, Xapian::termcount) const override { return 0; }
-  double get_maxextra() const override { return 0; }
-
- private:
-  void init(double worth) override { worth_ = worth; }
-
-  double worth_ = 0;
-};
-
-// The factor that a term's worth gets when it stands `count` times in a document.
+// The factor that a term's worth gets when it stands `count` times in a document: up to a tenth
+// more. No worth reaches the next higher one by that.
 double RepetitionFactor(Xapian::termcount count);
 
 }  // namespace searchd

@@ -1,13 +1,15 @@
 #include "host/searchd/searcher.h"
 
+#include <algorithm>
 #include <cstdio>
 #include <utility>
 
+#include "host/searchd/assessment.h"
 #include "host/searchd/common_words.h"
 #include "host/searchd/document.h"
 #include "host/searchd/fallback.h"
 #include "host/searchd/json_text.h"
-#include "host/searchd/query.h"
+#include "host/searchd/matcher.h"
 
 namespace searchd {
 namespace {
@@ -29,24 +31,25 @@ std::string ScoreText(double score) {
 }
 
 // What is stored is the text of what is shown: parsing it would take most of the time of a search.
-std::string HitText(const Xapian::MSetIterator& match, const Plan& plan, bool explain) {
-  const Xapian::Document document = match.get_document();
-  std::string hit = document.get_data();
-  if (hit.size() < 2 || hit.front() != '{' || hit.back() != '}') {
+std::string HitText(const Xapian::Document& document, double score) {
+  std::string text = document.get_data();
+  if (text.size() < 2 || text.front() != '{' || text.back() != '}') {
     throw Xapian::DatabaseCorruptError("a stored document is none");
   }
-  hit.pop_back();
-  if (hit.size() > 1) hit += ',';
-  hit += "\"score\":" + ScoreText(match.get_weight());
-  if (explain) hit += ",\"explain\":" + JsonText(AssessDocument(plan, document).reasons);
-  return hit + '}';
+  text.pop_back();
+  if (text.size() > 1) text += ',';
+  return text + "\"score\":" + ScoreText(score);
 }
 
-std::string HitTexts(const Xapian::MSet& matches, const Plan& plan, bool explain) {
+std::string HitTexts(const Xapian::Database& database, const std::vector<Hit>& hits,
+                     const Plan& plan, bool explain) {
   std::string texts = "[";
-  for (auto it = matches.begin(); it != matches.end(); ++it) {
+  for (const Hit& hit : hits) {
+    const Xapian::Document document = database.get_document(hit.document);
     if (texts.size() > 1) texts += ',';
-    texts += HitText(it, plan, explain);
+    texts += HitText(document, hit.worth);
+    if (explain) texts += ",\"explain\":" + JsonText(AssessDocument(plan, document).reasons);
+    texts += '}';
   }
   return texts + ']';
 }
@@ -68,20 +71,6 @@ std::string NameOfStep(How how) {
   return "fuzzy";
 }
 
-// The total of these, which Xapian knows exactly when it has looked at all documents.
-Xapian::doccount TotalOf(const Xapian::MSet& matches) { return matches.get_matches_estimated(); }
-
-Xapian::MSet Find(const Xapian::Database& database, const Plan& plan, unsigned offset,
-                  unsigned limit) {
-  if (plan.IsEmpty()) return {};
-  Xapian::Enquire enquire(database);
-  enquire.set_query(ToQuery(plan));
-  enquire.set_weighting_scheme(WorthWeight());
-  enquire.set_sort_by_relevance_then_value(kOrderSlot, false);
-  // Looking at all documents makes the total exact.
-  return enquire.get_mset(offset, limit, database.get_doccount());
-}
-
 }  // namespace
 
 Searcher::Searcher(const Mapping& mapping, const Language& language)
@@ -98,32 +87,35 @@ SearchResult Searcher::Search(const Xapian::Database& database, const SearchRequ
   Plan plan = MakePlan(fields_, analyzer_, request.query);
   AddUnfinishedForms(plan, fields_, analyzer_, database);
   MarkCommonWords(plan, fields_, analyzer_, database);
-  const bool first_page = request.offset == 0 && request.limit > 0;
-  Xapian::MSet hits = FindByAnyStep(database, plan, first_page ? request.limit : 1);
+  const std::vector<Hit> hits = FindByAnyStep(database, plan);
 
   SearchResult result;
   result.cut = plan.cut;
-  result.total = TotalOf(hits);
+  result.total = static_cast<Xapian::doccount>(hits.size());
   if (hits.empty()) return result;
-  result.matched = NameOfStep(AssessDocument(plan, hits.begin().get_document()).how);
-  if (request.limit == 0) return result;
-  if (!first_page) hits = Find(database, plan, request.offset, request.limit);
-  result.hits = HitTexts(hits, plan, request.explain);
+  const std::size_t end = std::size_t{request.offset} + request.limit;
+  std::vector<Hit> page = FirstOf(database, hits, std::max<std::size_t>(end, 1));
+  const Xapian::Document first = database.get_document(page.front().document);
+  result.matched = NameOfStep(AssessDocument(plan, first).how);
+  page.resize(std::min(page.size(), end));
+  page.erase(page.begin(), page.begin() + std::min<std::ptrdiff_t>(request.offset, page.size()));
+  result.hits = HitTexts(database, page, plan, request.explain);
   return result;
 }
 
-// The first `limit` hits by the first step that finds any. The plan is then that of this step.
-Xapian::MSet Searcher::FindByAnyStep(const Xapian::Database& database, Plan& plan, unsigned limit) {
-  Xapian::MSet hits = Find(database, plan, 0, limit);
+// The hits by the first step that finds any. The plan is then that of this step.
+std::vector<Hit> Searcher::FindByAnyStep(const Xapian::Database& database, Plan& plan) {
+  Matcher matcher(database);
+  std::vector<Hit> hits = matcher.Find(plan);
   if (!hits.empty() || plan.IsEmpty()) return hits;
-  if (MarkUnfinishedCommonWord(plan, analyzer_)) hits = Find(database, plan, 0, limit);
+  if (MarkUnfinishedCommonWord(plan, analyzer_)) hits = matcher.Find(plan);
   if (!hits.empty()) return hits;
-  if (AddMarkless(plan, fields_, analyzer_)) hits = Find(database, plan, 0, limit);
+  if (AddMarkless(plan, fields_, analyzer_)) hits = matcher.Find(plan);
   if (!hits.empty()) return hits;
   if (!vocabulary_) vocabulary_ = std::make_unique<Vocabulary>(database, fields_);
-  if (AddContaining(plan, fields_, analyzer_, *vocabulary_)) hits = Find(database, plan, 0, limit);
+  if (AddContaining(plan, fields_, analyzer_, *vocabulary_)) hits = matcher.Find(plan);
   if (!hits.empty()) return hits;
-  if (AddNearly(plan, fields_, analyzer_, *vocabulary_)) hits = Find(database, plan, 0, limit);
+  if (AddNearly(plan, fields_, analyzer_, *vocabulary_)) hits = matcher.Find(plan);
   return hits;
 }
 

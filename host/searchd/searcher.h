@@ -9,6 +9,7 @@
 
 #include "host/searchd/analyzer.h"
 #include "host/searchd/mapping.h"
+#include "host/searchd/matcher.h"
 #include "host/searchd/planner.h"
 #include "host/searchd/vocabulary.h"
 
@@ -39,7 +40,7 @@ class Searcher {
   void Forget();
 
  private:
-  Xapian::MSet FindByAnyStep(const Xapian::Database& database, Plan& plan, unsigned limit);
+  std::vector<Hit> FindByAnyStep(const Xapian::Database& database, Plan& plan);
 
   Analyzer analyzer_;
   std::vector<Field> fields_;

@@ -4,7 +4,6 @@
 #include <unicode/unistr.h>
 
 #include <algorithm>
-#include <bitset>
 #include <cstdint>
 #include <utility>
 
@@ -36,6 +35,8 @@ std::uint64_t Summary(const std::u32string& letters) {
   }
   return summary;
 }
+
+bool HasSeveralBits(std::uint64_t bits) { return (bits & (bits - 1)) != 0; }
 
 bool IsAscii(const std::string& text) {
   return std::all_of(text.begin(), text.end(), [](char c) { return (c & 0x80) == 0; });
@@ -86,11 +87,11 @@ void Vocabulary::Shelf::Read(const Xapian::Database& database, const std::string
 
 std::vector<std::string> Vocabulary::Shelf::Find(const Wanted& wanted) const {
   const std::uint64_t needed = Summary(wanted.some_of);
-  const auto most_lacking = static_cast<std::size_t>(wanted.but_for);
   std::vector<std::string> found;
   for (std::size_t i = 0; i < terms_.size() && found.size() < kMaxFound; ++i) {
-    const std::bitset<64> lacking(needed & ~summaries_[i]);
-    if (lacking.count() <= most_lacking && wanted.accept(letters_[i])) found.push_back(terms_[i]);
+    const std::uint64_t lacking = needed & ~summaries_[i];
+    const bool lacks_too_many = wanted.may_lack_one ? HasSeveralBits(lacking) : lacking != 0;
+    if (!lacks_too_many && wanted.accept(letters_[i])) found.push_back(terms_[i]);
   }
   return found;
 }

@@ -22,11 +22,11 @@ class Vocabulary {
   // Reads the terms of the members that are searched.
   Vocabulary(const Xapian::Database& database, const std::vector<Field>& fields);
 
-  // What is looked for. Texts that lack more of the letters `some_of` than `but_for` are passed
-  // over; of the others `accept` says whether they are wanted.
+  // What is looked for. Texts that lack one of the letters `some_of`, or two where one may be
+  // lacking, are passed over; of the others `accept` says whether they are wanted.
   struct Wanted {
     const std::u32string& some_of;
-    int but_for;
+    bool may_lack_one;
     std::function<bool(const std::u32string& letters)> accept;
   };
 

@@ -72,6 +72,8 @@ class TEISEIGATRO_EXPORT StringPool {
   std::map<std::string, std::string> roots_;                    // by descriptor path
   std::map<std::string, std::shared_ptr<LanguagePack>> packs_;  // by texts root
   std::string texts_root_;
+  const LanguagePack* pack_ = nullptr;  // the one that was asked last, of packs_
+  std::string pack_root_;
 };
 
 }  // namespace velkor::appindex

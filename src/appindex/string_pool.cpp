@@ -127,7 +127,12 @@ std::shared_ptr<LanguagePack> StringPool::GetLangPack(const std::string& texts_r
 
 std::string StringPool::GetString(const std::string& lang, const std::string& section,
                                   const std::string& key) {
-  return GetLangPack(texts_root_)->GetString(lang, section, key);
+  if (pack_ == nullptr || pack_root_ != texts_root_) {
+    const LanguagePack* pack = GetLangPack(texts_root_).get();
+    pack_root_ = texts_root_;
+    pack_ = pack;
+  }
+  return pack_->GetString(lang, section, key);
 }
 
 std::string StringPool::GetString(const std::string& lang, const std::string& ref) {

@@ -202,8 +202,8 @@ TEST(StemTest, IsNoneWithoutAStemmer) {
   }
 }
 
-TEST(BeginningsTest, HaveUpToThreeCharacters) {
-  EXPECT_EQ(Beginnings("mail"), (Strings{"m", "ma", "mai"}));
+TEST(BeginningsTest, HaveUpToTwoCharacters) {
+  EXPECT_EQ(Beginnings("mail"), (Strings{"m", "ma"}));
   EXPECT_EQ(Beginnings("文件"), (Strings{"文", "文件"}));
   EXPECT_EQ(Beginnings(""), Strings{});
 }

@@ -1,5 +1,5 @@
-// What Xapian makes of a plan and what Assess says of each document are the same.
-#include "host/searchd/query.h"
+// What a Matcher makes of a plan and what Assess says of each document are the same.
+#include "host/searchd/matcher.h"
 
 #include <gtest/gtest.h>
 
@@ -11,6 +11,7 @@
 #include <string>
 #include <vector>
 
+#include "host/searchd/assessment.h"
 #include "host/searchd/common_words.h"
 #include "host/searchd/fallback.h"
 #include "tests/unit/searchd/memory_index.h"
@@ -88,12 +89,10 @@ DocumentTerms TermsOf(const Xapian::Document& document) {
 }
 
 std::map<Xapian::docid, double> WeightsOf(const Xapian::Database& database, const Plan& plan) {
-  Xapian::Enquire enquire(database);
-  enquire.set_query(ToQuery(plan));
-  enquire.set_weighting_scheme(WorthWeight());
   std::map<Xapian::docid, double> weights;
-  const Xapian::MSet hits = enquire.get_mset(0, database.get_doccount());
-  for (auto hit = hits.begin(); hit != hits.end(); ++hit) weights[*hit] = hit.get_weight();
+  for (const Hit& hit : Matcher(database).Find(plan)) {
+    EXPECT_TRUE(weights.emplace(hit.document, hit.worth).second) << "found twice";
+  }
   return weights;
 }
 
@@ -147,7 +146,7 @@ class Comparison {
   std::map<Xapian::docid, DocumentTerms> terms_;
 };
 
-TEST(QueryTest, XapianGivesEachDocumentTheWorthThatAssessSays) {
+TEST(MatcherTest, EachDocumentGetsTheWorthThatAssessSays) {
   std::uint32_t seed = 1;
   for (const Script& script : Scripts()) {
     std::size_t hits = 0;
@@ -160,7 +159,7 @@ TEST(QueryTest, XapianGivesEachDocumentTheWorthThatAssessSays) {
 }
 
 // A page of hits is a part of one list, and the total that of the list.
-TEST(QueryTest, TheFirstHitsAreTheFirstOfAll) {
+TEST(MatcherTest, TheFirstHitsAreTheFirstOfAll) {
   std::uint32_t seed = 100;
   for (const Script& script : Scripts()) {
     Texts texts(script.syllables, seed++);
@@ -178,8 +177,10 @@ TEST(QueryTest, TheFirstHitsAreTheFirstOfAll) {
   }
 }
 
-TEST(QueryTest, AnEmptyPlanFindsNothing) {
-  EXPECT_TRUE(ToQuery(Plan()).empty());
+TEST(MatcherTest, AnEmptyPlanFindsNothing) {
+  MemoryIndex index;
+  index.Add("files", "Files");
+  EXPECT_TRUE(Matcher(index.Database()).Find(Plan()).empty());
   EXPECT_EQ(Assess(Plan(), {{"A", 1}}).worth, 0);
 }
 

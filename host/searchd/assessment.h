@@ -1,4 +1,4 @@
-// A plan as Xapian carries it out, and what it says of one document.
+// What a plan says of one document, term by term, for people who ask why it was found.
 #pragma once
 
 #include <json/value.h>
@@ -11,9 +11,6 @@
 
 namespace searchd {
 
-// The query whose weights, under WorthWeight, are what Assess says of each document that it finds.
-Xapian::Query ToQuery(const Plan& plan);
-
 // The terms of a document, and how often each stands in it.
 using DocumentTerms = std::map<std::string, Xapian::termcount>;
 
@@ -23,6 +20,7 @@ struct Assessment {
   Json::Value reasons = Json::Value(Json::arrayValue);  // for people: what was found, where and how
 };
 
+// The worth is the one that a Matcher gives the document.
 Assessment Assess(const Plan& plan, const DocumentTerms& terms);
 
 }  // namespace searchd
