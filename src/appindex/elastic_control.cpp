@@ -63,6 +63,16 @@ void WaitForSocket() {
   }
 }
 
+// The reply to almost every request. Parsing it would cost as much as sending a document.
+constexpr char kPlainSuccess[] = R"({"success":true})";
+
+bool ParseReply(Json::Value& response, const std::string& text) {
+  if (text != kPlainSuccess) return fromString(response, text);
+  response = Json::Value(Json::objectValue);
+  response["success"] = true;
+  return true;
+}
+
 bool IsReply(const Json::Value& reply) {
   return reply.isObject() && reply.isMember("success") && reply["success"].isBool();
 }
@@ -120,7 +130,7 @@ void SendRequestImpl(Json::Value& response, const std::string& request_text) {
                "!conn.Send(req.toString())", Error::kElasticdRequestError,
                [&] { return "Send failed, req=" + request_text; });
   std::string reply;
-  CheckOrThrow(conn.Recv(reply) && fromString(response, reply) && IsReply(response),
+  CheckOrThrow(conn.Recv(reply) && ParseReply(response, reply) && IsReply(response),
                {kModule, 89, "SendRequestImpl"},
                "!conn.Recv(resp_raw) || !res.fromString(resp_raw) || !res.isMember(\"success\") || "
                "!res[\"success\"].isBool()",
@@ -168,14 +178,17 @@ void AppIndexCreate(const std::string& lang) {
 
 void AppIndexDelete(const std::string& lang) { SendCommand("index_delete", MakeData(lang)); }
 
-void IndexUpsert(const std::string& lang, const Json::Value& doc) {
+std::string UpsertRequest(const std::string& lang, const Json::Value& doc) {
   std::string doc_id;
   GetStrictString(doc_id, doc, "id", true);
 
   // Put together as text: a Json::Value of the request would copy the whole document.
-  SendRequest(R"({"command":"document_upsert_by_id","data":{"id":)" +
-              toString(GetAppIndexID(lang)) + R"(,"doc_id":)" + toString(doc_id) + R"(,"data":)" +
-              toString(doc) + "}}");
+  return R"({"command":"document_upsert_by_id","data":{"id":)" + toString(GetAppIndexID(lang)) +
+         R"(,"doc_id":)" + toString(doc_id) + R"(,"data":)" + toString(doc) + "}}";
+}
+
+void IndexUpsert(const std::string& lang, const Json::Value& doc) {
+  SendRequest(UpsertRequest(lang, doc));
 }
 
 void IndexDelete(const std::string& lang, const std::string& doc_id) {

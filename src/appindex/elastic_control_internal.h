@@ -25,6 +25,9 @@ void SendRequestImpl(Json::Value& response, const std::string& request_text);
 void SendRequest(const Json::Value& request);
 void SendRequest(const std::string& request_text);
 
+// What IndexUpsert sends. Throws Error 120 when the document has no "id" that is a string.
+std::string UpsertRequest(const std::string& lang, const Json::Value& doc);
+
 // The schema of an app index as the daemon is told it. Throws Error 502, logged, when `mappings` is
 // not JSON.
 Json::Value GetAppIndexMappings(const std::string& mappings);
