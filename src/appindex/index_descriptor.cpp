@@ -38,56 +38,71 @@ Json::Value MakeRecord(const std::string& conf_path, const Json::Value& item,
   return record;
 }
 
-void AppendModule(Json::Value& records, const std::string& conf_path, const Json::Value& module,
+// Returns whether there was nothing to complain about.
+bool AppendModule(Json::Value& records, const std::string& conf_path, const Json::Value& module,
                   const Json::Value& entry) {
-  if (!module.isObject() || !IsForThisDevice(module)) return;
+  if (!module.isObject() || !IsForThisDevice(module)) return true;
   const Json::Value& app = entry["app"];
   const Json::Value& params = module["params"];
   if (!isJsonType<std::string>(app) || !isJsonType<std::string>(params)) {
     LogMalformed(conf_path);
-    return;
+    return false;
   }
   Json::Value record = MakeRecord(conf_path, module, entry);
   record["id"] = app.asString() + kModuleIdSeparator + params.asString();
   record["owner"] = app;
   records.append(std::move(record));
+  return true;
 }
 
-void AppendEntry(Json::Value& records, const std::string& conf_path, const Json::Value& entry) {
-  if (!entry.isObject() || !IsForThisDevice(entry)) return;
+bool AppendEntry(Json::Value& records, const std::string& conf_path, const Json::Value& entry) {
+  if (!entry.isObject() || !IsForThisDevice(entry)) return true;
   Json::Value record = MakeRecord(conf_path, entry, entry);
   record["id"] = entry["app"];
   record["owner"] = "";
   records.append(std::move(record));
+  bool complete = true;
   for (const Json::Value& module : entry["modules"]) {
-    AppendModule(records, conf_path, module, entry);
+    complete = AppendModule(records, conf_path, module, entry) && complete;
   }
+  return complete;
 }
 
 }  // namespace
 
-Json::Value Descriptor::FindIndexables() {
-  Json::Value records(Json::arrayValue);
-  if (!Read()) {
+const Json::Value& Descriptor::FindIndexables() {
+  std::string text;
+  if (!ReadRegularFile(conf_path_, kMaxJsonFileBytes, text)) {
+    Forget();
     LogMalformed(conf_path_);
-    return records;
+  } else if (text != text_) {
+    Parse(std::move(text));
   }
-  const Json::Value& root = root_;
-  if (root.isObject()) {
-    AppendEntry(records, conf_path_, root);
-  } else {
-    for (const Json::Value& entry : root) AppendEntry(records, conf_path_, entry);
-  }
-  return records;
+  return records_;
 }
 
-bool Descriptor::Read() {
-  std::string text;
-  if (!ReadRegularFile(conf_path_, kMaxJsonFileBytes, text)) return false;
-  if (text == text_) return true;
-  if (!fromString(root_, text)) return false;
-  text_ = std::move(text);
-  return true;
+void Descriptor::Forget() {
+  text_.reset();
+  records_ = Json::Value(Json::arrayValue);
+}
+
+// What was complained about is parsed and complained about anew each time.
+void Descriptor::Parse(std::string text) {
+  Forget();
+  Json::Value root;
+  if (!fromString(root, text)) {
+    LogMalformed(conf_path_);
+    return;
+  }
+  bool complete = true;
+  if (root.isObject()) {
+    complete = AppendEntry(records_, conf_path_, root);
+  } else {
+    for (const Json::Value& entry : root) {
+      complete = AppendEntry(records_, conf_path_, entry) && complete;
+    }
+  }
+  if (complete) text_ = std::move(text);
 }
 
 bool FindIndexConfByAppRoot(std::string& conf_path, const std::string& find_dir, unsigned depth) {

@@ -17,7 +17,7 @@ constexpr char kIndexMgr[] = "index_mgr";  // the module's name in log lines
 constexpr char kIndexConf[] = "index.conf";
 
 // One descriptor, read as often as it is asked for, since a package may be changed meanwhile. What
-// the file holds is parsed again only when that is not what it held the last time.
+// the file holds is parsed and filtered again only when that is not what it held the last time.
 class Descriptor {
  public:
   explicit Descriptor(std::string conf_path) : conf_path_(std::move(conf_path)) {}
@@ -25,15 +25,17 @@ class Descriptor {
   // Reads the file and gives the array of its indexable records, those that the device filters let
   // pass, in file order: each an object with "path", "id", "title", "desc", "keywords",
   // "stringset" and "owner". A file that cannot be read or parsed is logged and gives none; so is a
-  // module whose id cannot be made into text. Throws only what IsPassFilter throws.
-  Json::Value FindIndexables();
+  // module whose id cannot be made into text. Throws only what IsPassFilter throws. The reference
+  // is to what the next call changes.
+  const Json::Value& FindIndexables();
 
  private:
-  bool Read();
+  void Forget();
+  void Parse(std::string text);
 
   const std::string conf_path_;
-  std::optional<std::string> text_;  // that root_ was parsed from
-  Json::Value root_;
+  std::optional<std::string> text_;  // that gave records_ without a complaint
+  Json::Value records_;
 };
 
 // The records of a descriptor that is read once.

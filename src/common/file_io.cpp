@@ -5,7 +5,7 @@
 #include <sys/stat.h>
 #include <unistd.h>
 
-#include <array>
+#include <algorithm>
 #include <cerrno>
 #include <cstdio>
 
@@ -55,18 +55,21 @@ bool ReadRegularFile(const std::string& path, std::size_t limit, std::string& co
   if (!S_ISREG(info.st_mode)) return FailWith(S_ISDIR(info.st_mode) ? EISDIR : EINVAL);
 
   const int kept = errno;
-  std::string text;
-  std::array<char, 16384> chunk{};
+  // Room for one byte more than the file is said to have: where it has more, the text grows.
+  std::string text(std::min(static_cast<std::size_t>(info.st_size), limit) + 1, '\0');
+  std::size_t done = 0;
   for (;;) {
-    const ssize_t n = read(fd.Get(), chunk.data(), chunk.size());
+    const ssize_t n = read(fd.Get(), &text[done], text.size() - done);
     if (n == 0) break;
     if (n < 0) {
       if (errno == EINTR) continue;
       return false;
     }
-    text.append(chunk.data(), static_cast<std::size_t>(n));
-    if (text.size() > limit) return FailWith(EFBIG);
+    done += static_cast<std::size_t>(n);
+    if (done > limit) return FailWith(EFBIG);
+    if (done == text.size()) text.resize(2 * text.size());
   }
+  text.resize(done);
   content.swap(text);
   errno = kept;  // a read that was interrupted and then went well is no failure
   return true;
