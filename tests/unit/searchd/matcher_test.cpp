@@ -177,6 +177,44 @@ TEST(MatcherTest, TheFirstHitsAreTheFirstOfAll) {
   }
 }
 
+class FirstOfTest : public testing::Test {
+ protected:
+  FirstOfTest() {
+    for (const char* title : {"Delta", "Alpha", "Echo", "Charlie", "Bravo"}) {
+      index_.Add(title, title);
+    }
+  }
+
+  std::vector<Xapian::docid> First(std::vector<Hit> hits, std::size_t count) {
+    std::vector<Xapian::docid> documents;
+    for (const Hit& hit : FirstOf(index_.Database(), std::move(hits), count)) {
+      documents.push_back(hit.document);
+    }
+    return documents;
+  }
+
+  MemoryIndex index_;
+};
+
+TEST_F(FirstOfTest, TheBestComeFirst) {
+  EXPECT_EQ(First({{1, 3}, {2, 1}, {3, 5}, {4, 2}}, 3), (std::vector<Xapian::docid>{3, 1, 4}));
+}
+
+TEST_F(FirstOfTest, WhereTheyAreWorthTheSameTheirTitlesDecide) {
+  EXPECT_EQ(First({{1, 2}, {2, 2}, {3, 2}, {4, 2}, {5, 2}}, 3),
+            (std::vector<Xapian::docid>{2, 5, 4}));
+}
+
+TEST_F(FirstOfTest, TitlesDecideAmongTheLastOfThemToo) {
+  EXPECT_EQ(First({{3, 9}, {1, 2}, {4, 2}, {2, 2}, {5, 1}}, 2), (std::vector<Xapian::docid>{3, 2}));
+}
+
+TEST_F(FirstOfTest, ThereAreNoMoreThanThereAre) {
+  EXPECT_EQ(First({{1, 1}, {2, 2}}, 1000), (std::vector<Xapian::docid>{2, 1}));
+  EXPECT_EQ(First({{1, 1}}, 0), std::vector<Xapian::docid>{});
+  EXPECT_EQ(First({}, 5), std::vector<Xapian::docid>{});
+}
+
 TEST(MatcherTest, AnEmptyPlanFindsNothing) {
   MemoryIndex index;
   index.Add("files", "Files");

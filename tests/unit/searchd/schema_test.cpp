@@ -1,4 +1,5 @@
 // Indexes whose mapping is another one than that of applications.
+#include <gmock/gmock.h>
 #include <gtest/gtest.h>
 
 #include <string>
@@ -125,6 +126,19 @@ TEST(SchemaTest, TextsOfOneMemberAreNotThoseOfAnother) {
   EXPECT_EQ(index.Find("mail"), Strings{});
   EXPECT_EQ(index.Find("bmail"), Strings{});
   EXPECT_EQ(index.Find("x"), Strings{"1"});
+}
+
+// The app indexes give a title twice. Others may give it once, or something else beside it.
+TEST(SchemaTest, TitlesWithoutSpacesAreFoundByPartsWhateverStandsBesideThem) {
+  MemoryIndex index("jpn");
+  Json::Value twice = test::Document("twice", "写真管理");
+  Json::Value once = test::Document("once", "写真管理");
+  once.removeMember("search_title");
+  Json::Value other = test::Document("other", "写真管理");
+  other["search_title"] = "アルバム";
+  for (const Json::Value& document : {twice, once, other}) index.Add(document);
+  EXPECT_THAT(index.Find("真管"), testing::UnorderedElementsAre("twice", "once", "other"));
+  EXPECT_EQ(index.Find("ルバ"), Strings{"other"});
 }
 
 TEST(SchemaTest, WithoutOwnersNoDocumentIsAnApplication) {
