@@ -1,5 +1,8 @@
 #include "host/searchd/index.h"
 
+#include <optional>
+#include <set>
+#include <string>
 #include <utility>
 
 #include "host/searchd/document.h"
@@ -23,9 +26,10 @@ bool Index::Delete(const std::string& document_id) { return Writer().Queue({docu
 void Index::ApplyChanges() { writer_.ApplyQueued(); }
 
 void Index::Commit() {
-  if (!Writer().Commit()) return;
+  std::optional<std::set<std::string>> new_terms = Writer().Commit();
+  if (!new_terms) return;
   const std::lock_guard lock(reader_mutex_);
-  if (reader_) reader_->Refresh();
+  if (reader_) reader_->Refresh(std::move(*new_terms));
 }
 
 bool Index::HasWork() const { return writer_.HasWork(); }

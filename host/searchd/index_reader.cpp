@@ -32,6 +32,12 @@ Xapian::doccount IndexReader::DocumentCount() {
   return count;
 }
 
+void IndexReader::Refresh(std::set<std::string> new_terms) {
+  const std::lock_guard lock(new_terms_mutex_);
+  new_terms_.merge(new_terms);
+  stale_ = true;
+}
+
 void IndexReader::Close() {
   const std::lock_guard lock(mutex_);
   closed_ = true;
@@ -55,9 +61,15 @@ void IndexReader::Read(const std::function<void(Xapian::Database&)>& read) {
   }
 }
 
+void IndexReader::LearnNewTerms() {
+  const std::lock_guard lock(new_terms_mutex_);
+  if (searcher_) searcher_->Update(new_terms_);
+  new_terms_.clear();
+}
+
 void IndexReader::OpenDatabase() {
   const bool stale = stale_.exchange(false);
-  if (stale && searcher_) searcher_->Forget();
+  if (stale) LearnNewTerms();
   if (database_) {
     if (stale) database_->reopen();
     return;

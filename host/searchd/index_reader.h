@@ -7,6 +7,7 @@
 #include <functional>
 #include <memory>
 #include <mutex>
+#include <set>
 #include <string>
 
 #include "host/searchd/database_check.h"
@@ -24,8 +25,9 @@ class IndexReader {
   SearchResult Search(const SearchRequest& request);
   Xapian::doccount DocumentCount();
 
-  // Makes the next call look at the files again.
-  void Refresh() { stale_ = true; }
+  // Makes the next call look at the files again. The words and titles are those that have been
+  // committed since the last time.
+  void Refresh(std::set<std::string> new_terms);
 
   // Lets go of the files; later calls find nothing.
   void Close();
@@ -34,6 +36,7 @@ class IndexReader {
   // Runs `read` on the open database; does nothing when nothing was ever committed or after Close.
   void Read(const std::function<void(Xapian::Database&)>& read);
   void OpenDatabase();
+  void LearnNewTerms();
 
   const std::string path_;
   const Mapping& mapping_;
@@ -45,6 +48,9 @@ class IndexReader {
   std::unique_ptr<Xapian::Database> database_;
   bool closed_ = false;
   std::atomic<bool> stale_ = false;
+
+  std::mutex new_terms_mutex_;
+  std::set<std::string> new_terms_;
 };
 
 }  // namespace searchd

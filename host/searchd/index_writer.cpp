@@ -7,6 +7,7 @@
 #include "host/searchd/request_error.h"
 #include "host/searchd/storage_error.h"
 #include "host/searchd/terms.h"
+#include "host/searchd/vocabulary.h"
 
 namespace searchd {
 namespace {
@@ -65,8 +66,8 @@ void IndexWriter::DoWork() {
   ApplyQueued();
 }
 
-bool IndexWriter::Commit() {
-  bool changed = false;
+std::optional<std::set<std::string>> IndexWriter::Commit() {
+  std::optional<std::set<std::string>> new_terms;
   {
     const std::lock_guard lock(write_mutex_);
     check_.Await();
@@ -75,12 +76,14 @@ bool IndexWriter::Commit() {
       const std::lock_guard queue_lock(queue_mutex_);
       ThrowFailure();
     }
-    changed = in_transaction_;
-    if (changed) CommitLocked();
+    if (in_transaction_) {
+      CommitLocked();
+      new_terms = std::exchange(new_terms_, {});
+    }
     ReopenLocked();
   }
   ApplyQueued();
-  return changed;
+  return new_terms;
 }
 
 void IndexWriter::Reopen() {
@@ -136,8 +139,10 @@ void IndexWriter::ApplyQueuedLocked() {
 void IndexWriter::Apply(const Change& change) {
   const std::string key = KeyTerm(change.document_id);
   if (change.document) {
-    database_->replace_document(
-        key, BuildDocument(mapping_, *analyzer_, change.document_id, *change.document));
+    const Xapian::Document document =
+        BuildDocument(mapping_, *analyzer_, change.document_id, *change.document);
+    database_->replace_document(key, document);
+    AddWordsAndTitles(new_terms_, document);
   } else {
     database_->delete_document(key);
   }
@@ -210,6 +215,7 @@ void IndexWriter::LetGo() {
   database_.reset();
   in_transaction_ = false;
   unflushed_ = false;
+  new_terms_.clear();
 }
 
 }  // namespace searchd

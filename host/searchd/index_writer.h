@@ -9,6 +9,7 @@
 #include <memory>
 #include <mutex>
 #include <optional>
+#include <set>
 #include <string>
 
 #include "host/searchd/analyzer.h"
@@ -46,8 +47,9 @@ class IndexWriter {
   bool HasWork() const { return (queued_ && !busy_) || unflushed_; }
   void DoWork();
 
-  // Applies what is queued and makes all changes durable. Returns whether there were any.
-  bool Commit();
+  // Applies what is queued and makes all changes durable. If there were any, returns the words and
+  // titles that they brought.
+  std::optional<std::set<std::string>> Commit();
 
   // Lets go of the files and has them checked before they are opened again; if there are
   // uncommitted changes, as soon as they are committed.
@@ -87,6 +89,7 @@ class IndexWriter {
   bool reopen_ = false;
   bool created_ = false;  // by this object, and nothing committed since
   bool in_transaction_ = false;
+  std::set<std::string> new_terms_;  // words and titles that it brings
   bool closed_ = false;
   std::atomic<bool> queued_ = false;
   std::atomic<bool> busy_ = false;  // another process held the index at the last attempt

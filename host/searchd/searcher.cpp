@@ -76,8 +76,8 @@ std::string NameOfStep(How how) {
 Searcher::Searcher(const Mapping& mapping, const Language& language)
     : analyzer_(language), fields_(SearchedFields(mapping)) {}
 
-void Searcher::Forget() {
-  vocabulary_.reset();
+void Searcher::Update(const std::set<std::string>& new_terms) {
+  if (vocabulary_ && !vocabulary_->Learn(new_terms)) vocabulary_.reset();
   knows_fields_ = false;
 }
 

@@ -4,6 +4,7 @@
 #include <xapian.h>
 
 #include <memory>
+#include <set>
 #include <string>
 #include <vector>
 
@@ -36,8 +37,9 @@ class Searcher {
 
   SearchResult Search(const Xapian::Database& database, const SearchRequest& request);
 
-  // To be called when the database is another one than before, or in another state.
-  void Forget();
+  // To be called when the database is in another state than before, with the words and titles of
+  // the documents that were written since.
+  void Update(const std::set<std::string>& new_terms);
 
  private:
   std::vector<Hit> FindByAnyStep(const Xapian::Database& database, Plan& plan);

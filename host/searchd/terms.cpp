@@ -57,6 +57,15 @@ std::string WordTermBeginning(const std::string& prefix, const std::string& begi
   return prefix + Cut(beginning, kMaxBeginningBytes);
 }
 
+bool IsWordOrTitle(const std::string& term) {
+  if (term.compare(0, 1, kSkeletonPrefix) == 0) return true;
+  const auto first = static_cast<unsigned char>(term[0]);
+  const std::size_t space = 1U + (first & ~unsigned{kFieldPrefix});
+  if (first < kFieldPrefix || space >= term.size()) return false;
+  return term[space] == static_cast<char>(Space::kWords) ||
+         term[space] == static_cast<char>(Space::kPlainWords);
+}
+
 std::string Pair(const std::string& first, const std::string& second) {
   return first + ' ' + second;
 }

@@ -63,6 +63,9 @@ std::string WordTerm(const std::string& prefix, const std::string& word);
 // What the terms of all words that begin with `beginning` begin with.
 std::string WordTermBeginning(const std::string& prefix, const std::string& beginning);
 
+// Whether a term is that of a word, with or without accents, or of a title without spaces.
+bool IsWordOrTitle(const std::string& term);
+
 // Two words that follow each other, as one.
 std::string Pair(const std::string& first, const std::string& second);
 

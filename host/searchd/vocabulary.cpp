@@ -59,12 +59,18 @@ std::u32string Letters(const std::string& utf8) {
   return letters;
 }
 
+void AddWordsAndTitles(std::set<std::string>& terms, const Xapian::Document& document) {
+  for (auto term = document.termlist_begin(); term != document.termlist_end(); ++term) {
+    if (IsWordOrTitle(*term)) terms.insert(*term);
+  }
+}
+
 Vocabulary::Vocabulary(const Xapian::Database& database, const std::vector<Field>& fields) {
   titles_.Read(database, kSkeletonPrefix);
   for (const Field& field : fields) {
     Shelf words;
-    words.Read(database, FieldPrefix(field.member, Space::kWords));
     words.Read(database, FieldPrefix(field.member, Space::kPlainWords));
+    words.Read(database, FieldPrefix(field.member, Space::kWords));
     words_.push_back(std::move(words));
   }
 }
@@ -77,12 +83,43 @@ std::vector<std::string> Vocabulary::FindTitles(const Wanted& wanted) const {
   return titles_.Find(wanted);
 }
 
+bool Vocabulary::Learn(const std::set<std::string>& terms) {
+  std::size_t size = titles_.Size();
+  for (const Shelf& words : words_) size += words.Size();
+  learnt_ += terms.size();
+  if (learnt_ > size) return false;
+  titles_.Learn(terms);
+  for (Shelf& words : words_) words.Learn(terms);
+  return true;
+}
+
 void Vocabulary::Shelf::Read(const Xapian::Database& database, const std::string& prefix) {
   for (auto term = database.allterms_begin(prefix); term != database.allterms_end(prefix); ++term) {
-    terms_.push_back(*term);
-    letters_.push_back(Letters(terms_.back().substr(prefix.size())));
-    summaries_.push_back(Summary(letters_.back()));
+    Add(*term, prefix);
   }
+  prefixes_.push_back(prefix);
+}
+
+void Vocabulary::Shelf::Learn(const std::set<std::string>& terms) {
+  for (const std::string& prefix : prefixes_) {
+    for (auto term = terms.lower_bound(prefix);
+         term != terms.end() && term->compare(0, prefix.size(), prefix) == 0; ++term) {
+      if (Knows(*term)) continue;
+      Add(*term, prefix);
+      learnt_.insert(*term);
+    }
+  }
+}
+
+bool Vocabulary::Shelf::Knows(const std::string& term) const {
+  const auto read_end = terms_.end() - static_cast<std::ptrdiff_t>(learnt_.size());
+  return std::binary_search(terms_.begin(), read_end, term) || learnt_.count(term) != 0;
+}
+
+void Vocabulary::Shelf::Add(const std::string& term, const std::string& prefix) {
+  terms_.push_back(term);
+  letters_.push_back(Letters(term.substr(prefix.size())));
+  summaries_.push_back(Summary(letters_.back()));
 }
 
 std::vector<std::string> Vocabulary::Shelf::Find(const Wanted& wanted) const {

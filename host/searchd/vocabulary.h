@@ -6,6 +6,7 @@
 
 #include <cstdint>
 #include <functional>
+#include <set>
 #include <string>
 #include <vector>
 
@@ -17,10 +18,18 @@ namespace searchd {
 // The same letter is the same number in any text.
 std::u32string Letters(const std::string& utf8);
 
+// Adds those terms of a document that a vocabulary may have to know.
+void AddWordsAndTitles(std::set<std::string>& terms, const Xapian::Document& document);
+
 class Vocabulary {
  public:
   // Reads the terms of the members that are searched.
   Vocabulary(const Xapian::Database& database, const std::vector<Field>& fields);
+
+  // Adds terms that documents have brought with them. Terms that went with documents stay, which
+  // finds nothing but costs time: returns false when so much was added that reading it all anew is
+  // the better way.
+  bool Learn(const std::set<std::string>& terms);
 
   // What is looked for. Texts that lack one of the letters `some_of`, or two where one may be
   // lacking, are passed over; of the others `accept` says whether they are wanted.
@@ -40,18 +49,27 @@ class Vocabulary {
  private:
   class Shelf {
    public:
-    // Adds all terms that begin with `prefix`.
+    // Adds all terms that begin with `prefix`, in the order of prefixes.
     void Read(const Xapian::Database& database, const std::string& prefix);
+    // Adds those of the terms that begin with a prefix that was read and are not known yet.
+    void Learn(const std::set<std::string>& terms);
     std::vector<std::string> Find(const Wanted& wanted) const;
+    std::size_t Size() const { return terms_.size(); }
 
    private:
-    std::vector<std::string> terms_;
+    bool Knows(const std::string& term) const;
+    void Add(const std::string& term, const std::string& prefix);
+
+    std::vector<std::string> prefixes_;
+    std::set<std::string> learnt_;
+    std::vector<std::string> terms_;  // those that were read in order, behind them those in learnt_
     std::vector<std::u32string> letters_;   // of what follows the prefix of each term
     std::vector<std::uint64_t> summaries_;  // of the letters, to pass most of them over quickly
   };
 
   std::vector<Shelf> words_;  // by field
   Shelf titles_;
+  std::size_t learnt_ = 0;  // how many terms were given to Learn
 };
 
 }  // namespace searchd

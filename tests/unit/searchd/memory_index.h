@@ -5,6 +5,7 @@
 #include <json/value.h>
 #include <xapian.h>
 
+#include <set>
 #include <string>
 #include <vector>
 
@@ -14,6 +15,7 @@
 #include "host/searchd/mapping.h"
 #include "host/searchd/searcher.h"
 #include "host/searchd/terms.h"
+#include "host/searchd/vocabulary.h"
 #include "tests/support/searchd_requests.h"
 
 namespace searchd {
@@ -43,8 +45,11 @@ class MemoryIndex {
   void Add(const Json::Value& document) {
     const std::string id = document[mapping_.KeyField()].asString();
     CheckDocument(mapping_, id, document);
-    database_.replace_document(KeyTerm(id), BuildDocument(mapping_, analyzer_, id, document));
-    searcher_.Forget();
+    const Xapian::Document built = BuildDocument(mapping_, analyzer_, id, document);
+    database_.replace_document(KeyTerm(id), built);
+    std::set<std::string> new_terms;
+    AddWordsAndTitles(new_terms, built);
+    searcher_.Update(new_terms);
   }
 
   void Add(const std::string& id, const std::string& title, const std::string& keywords = "",
