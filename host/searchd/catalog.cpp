@@ -1,6 +1,7 @@
 #include "host/searchd/catalog.h"
 
 #include <syslog.h>
+#include <algorithm>
 
 #include <utility>
 
@@ -142,6 +143,12 @@ std::vector<std::shared_ptr<Index>> Catalog::All() const {
   std::vector<std::shared_ptr<Index>> all;
   for (const auto& [id, known] : indexes_) all.push_back(known.index);
   return all;
+}
+
+bool Catalog::HoldsBack() const {
+  const std::lock_guard lock(mutex_);
+  return std::any_of(indexes_.begin(), indexes_.end(),
+                     [](const auto& known) { return known.second.index->HoldsBack(); });
 }
 
 std::shared_ptr<Index> Catalog::FindWithWork() const {

@@ -45,6 +45,9 @@ class Catalog {
   // In the order of the ids.
   std::vector<std::shared_ptr<Index>> All() const;
 
+  // Whether some index holds changes back.
+  bool HoldsBack() const;
+
   // An index that has work to do; null if there is none.
   std::shared_ptr<Index> FindWithWork() const;
 

@@ -70,9 +70,10 @@ Json::Value EmptyObject() { return Json::Value(Json::objectValue); }
 
 }  // namespace
 
-// Changes of a document are queued, not carried out.
+// Changes of a document are queued, not carried out, unless too many wait.
 bool Dispatcher::IsQuick(const std::string& request) {
-  return request.size() <= kMaxQuickBytes && request.find("\"document_") < kCommandNameWithin;
+  return request.size() <= kMaxQuickBytes && request.find("\"document_") < kCommandNameWithin &&
+         !catalog_.HoldsBack();
 }
 
 Answer Dispatcher::Handle(const std::string& request, uid_t client) {

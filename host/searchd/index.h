@@ -40,6 +40,9 @@ class Index {
   void ApplyChanges();
   void Commit();
 
+  // Whether the next change is likely to wait until others have taken place.
+  bool HoldsBack() const { return writer_.HoldsBack(); }
+
   // Whether there is work that later requests need not do if it is done before, and doing it.
   bool HasWork() const;
   void DoWork();

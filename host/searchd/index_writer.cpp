@@ -15,6 +15,7 @@ namespace {
 constexpr std::size_t kManyQueued = 16;
 constexpr std::size_t kMaxQueued = 64;
 constexpr std::size_t kMaxQueuedBytes = 8 * 1024 * 1024;
+constexpr std::size_t kUsualBytes = std::size_t{16} * 1024;  // few changes are larger
 
 }  // namespace
 
@@ -33,6 +34,7 @@ bool IndexWriter::Queue(Change change) {
   queued_bytes_ += change.bytes;
   queue_.push_back(std::move(change));
   queued_ = true;
+  holds_back_ = IsFullLocked(kUsualBytes);
   busy_ = false;
   return queue_.size() >= kManyQueued;
 }
@@ -101,6 +103,10 @@ void IndexWriter::Close() {
 
 bool IndexWriter::IsFull(std::size_t more_bytes) {
   const std::lock_guard lock(queue_mutex_);
+  return IsFullLocked(more_bytes);
+}
+
+bool IndexWriter::IsFullLocked(std::size_t more_bytes) const {
   return queue_.size() >= kMaxQueued ||
          (!queue_.empty() && queued_bytes_ + more_bytes > kMaxQueuedBytes);
 }
@@ -108,6 +114,7 @@ bool IndexWriter::IsFull(std::size_t more_bytes) {
 std::deque<Change> IndexWriter::TakeQueue() {
   const std::lock_guard lock(queue_mutex_);
   queued_ = false;
+  holds_back_ = false;
   queued_bytes_ = 0;
   return std::exchange(queue_, {});
 }

@@ -39,6 +39,9 @@ class IndexWriter {
   // so much that clients have to be held back.
   bool Queue(Change change);
 
+  // Whether the next Queue is likely to apply what waits.
+  bool HoldsBack() const { return holds_back_; }
+
   // Applies what is queued, unless another thread is at it.
   void ApplyQueued();
 
@@ -60,6 +63,7 @@ class IndexWriter {
 
  private:
   bool IsFull(std::size_t more_bytes);
+  bool IsFullLocked(std::size_t more_bytes) const;
   std::deque<Change> TakeQueue();
   void ThrowFailure();
   void ApplyQueuedLocked();
@@ -92,6 +96,7 @@ class IndexWriter {
   std::set<std::string> new_terms_;  // words and titles that it brings
   bool closed_ = false;
   std::atomic<bool> queued_ = false;
+  std::atomic<bool> holds_back_ = false;
   std::atomic<bool> busy_ = false;  // another process held the index at the last attempt
   std::atomic<bool> unflushed_ = false;
 };

@@ -57,6 +57,25 @@ class IndexTest : public test::DeviceRootTest {
   std::unique_ptr<Index> index_;
 };
 
+// Whoever answers clients must not be the one to apply what too many of them have asked for.
+TEST_F(IndexTest, SaysThatItHoldsChangesBackWhileTooManyWait) {
+  EXPECT_FALSE(index_->HoldsBack());
+  for (int i = 0; i < 63; ++i) Upsert("new" + std::to_string(i));
+  EXPECT_FALSE(index_->HoldsBack());
+  Upsert("last");
+  EXPECT_TRUE(index_->HoldsBack());
+  index_->Commit();
+  EXPECT_FALSE(index_->HoldsBack());
+  EXPECT_EQ(index_->DocumentCount(), 64U);
+}
+
+TEST_F(IndexTest, SaysThatItHoldsChangesBackWhileTheyAreTooLarge) {
+  index_->Upsert("large", ParseJson(R"({"id":"large"})"), 8 * 1024 * 1024);
+  EXPECT_TRUE(index_->HoldsBack());
+  index_->ApplyChanges();
+  EXPECT_FALSE(index_->HoldsBack());
+}
+
 TEST_F(IndexTest, KeepsUncommittedChangesOverAReopening) {
   UpsertMany();
   index_->Reopen();
