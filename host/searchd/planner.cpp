@@ -38,13 +38,14 @@ class Planner {
     Clause clause{part, false, {}};
     for (const Field& field : fields_) {
       if (field.rule.analyzer == AnalyzerKind::kKeyword) continue;
-      const std::vector<Word> words = WordsOf(field, part);
+      const std::vector<Word> words = analyzer_.Words(field.rule, part);
       if (field.rule.ngram) {
         for (const Word& word : words) AddInside(clause.ways, field, {word}, {});
         continue;
       }
       AddWords(clause.ways, field, words, last);
       if (field.rule.analyzer == AnalyzerKind::kStandard) {
+        AddUnjoinedWords(clause.ways, field, words, last);
         AddRuns(clause.ways, field, words, analyzer_.WholeText(part));
       }
     }
@@ -56,7 +57,9 @@ class Planner {
     Clause clause{word, false, {}};
     for (const Field& field : fields_) {
       if (field.rule.ngram || field.rule.analyzer != AnalyzerKind::kStandard) continue;
-      AddWords(clause.ways, field, WordsOf(field, word), last);
+      const std::vector<Word> words = analyzer_.Words(field.rule, word);
+      AddWords(clause.ways, field, words, last);
+      AddUnjoinedWords(clause.ways, field, words, last);
     }
     return clause;
   }
@@ -85,17 +88,6 @@ class Planner {
     double factor;
   };
 
-  // A short word that an apostrophe joins to the next says nothing.
-  std::vector<Word> WordsOf(const Field& field, const std::string& part) {
-    std::vector<Word> words = analyzer_.Words(field.rule, part);
-    if (field.rule.analyzer != AnalyzerKind::kStandard) return words;
-    for (Word& word : words) {
-      const std::string behind = BehindApostrophe(word.raw);
-      if (!behind.empty()) word = analyzer_.WholeText(behind);
-    }
-    return words;
-  }
-
   // What is spelt as it was typed comes first.
   static std::vector<Form> Forms(const std::vector<Word>& words, bool has_plain_terms) {
     std::vector<Form> forms = {{&Word::raw, false, 1}};
@@ -115,10 +107,24 @@ class Planner {
     ways.push_back({field.member, field.role, how, worth, std::move(matches)});
   }
 
+  // A short word that an apostrophe joins to the next says little.
+  void AddUnjoinedWords(std::vector<Way>& ways, const Field& field, std::vector<Word> words,
+                        bool last) {
+    bool any = false;
+    for (Word& word : words) {
+      const std::string behind = BehindApostrophe(word.raw);
+      if (behind.empty()) continue;
+      word = analyzer_.WholeText(behind);
+      any = true;
+    }
+    if (any) AddWords(ways, field, words, last, kUnjoined);
+  }
+
   void AddWords(std::vector<Way>& ways, const Field& field, const std::vector<Word>& words,
-                bool last) {
+                bool last, double factor = 1) {
     if (words.empty() || !Has(field, Space::kWords)) return;
-    for (const Form& form : Forms(words, Has(field, Space::kPlainWords))) {
+    for (Form form : Forms(words, Has(field, Space::kPlainWords))) {
+      form.factor *= factor;
       AddForm(ways, field, words, form, last);
     }
     if (words.size() > 1) return;

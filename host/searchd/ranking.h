@@ -52,6 +52,7 @@ constexpr double kUnfinishedWorth = 5;
 constexpr double kWithoutAccents = 0.98;
 constexpr double kWithoutMarks = 0.9;
 constexpr double kWithTypo = 0.5;
+constexpr double kUnjoined = 0.99;  // without what an apostrophe joins to a word, as in "l'album"
 constexpr double kApart = 0.6;      // words that were typed as one, found as several
 constexpr double kScattered = 0.4;  // several words, found in more than one member
 

@@ -104,6 +104,14 @@ TEST(LanguagesTest, AnApostropheMayBeTypedAsTheKeyboardHasIt) {
                {"fre", "Éditeur d’images", {"d'images", "editeur d'im"}}});
 }
 
+TEST(LanguagesTest, AWordWithTheApostropheThatWasTypedComesFirst) {
+  MemoryIndex french("fre");
+  french.Add("a", "Albums");
+  french.Add("b", "Partage d'albums");
+  EXPECT_EQ(french.Find("d'albums"), (Strings{"b", "a"}));
+  EXPECT_EQ(french.Find("albums"), (Strings{"a", "b"}));
+}
+
 TEST(LanguagesTest, WordsBehindAnApostropheAreWords) {
   MemoryIndex french("fre");
   french.Add("title", "Album");
