@@ -1,7 +1,6 @@
 #include "host/searchd/catalog.h"
 
 #include <syslog.h>
-#include <algorithm>
 
 #include <utility>
 
@@ -25,8 +24,8 @@ Catalog::Catalog(const std::string& registry_file, CheckProcess& checks)
   for (IndexDefinition& definition : registry_.Load(registry_damage_)) {
     const std::string id = definition.id;
     const std::string entry = RegistryEntry(definition);
-    auto index =
-        std::make_shared<Index>(std::move(definition), checks_, DatabaseCheck::Files::kFound);
+    auto index = std::make_shared<Index>(std::move(definition), checks_,
+                                         DatabaseCheck::Files::kFound, crowded_indexes_);
     indexes_.emplace(id, Known{std::move(index), entry});
   }
   if (!registry_damage_.empty()) {
@@ -40,7 +39,8 @@ void Catalog::Create(const IndexDefinition& definition) {
   CheckNew(definition);
   const std::string id = definition.id;
   const std::string entry = RegistryEntry(definition);
-  auto index = std::make_shared<Index>(definition, checks_, DatabaseCheck::Files::kMade);
+  auto index =
+      std::make_shared<Index>(definition, checks_, DatabaseCheck::Files::kMade, crowded_indexes_);
   const bool known = ReusePath(definition);
   PrepareIndexDirectory(definition.path, known);
   {
@@ -143,12 +143,6 @@ std::vector<std::shared_ptr<Index>> Catalog::All() const {
   std::vector<std::shared_ptr<Index>> all;
   for (const auto& [id, known] : indexes_) all.push_back(known.index);
   return all;
-}
-
-bool Catalog::HoldsBack() const {
-  const std::lock_guard lock(mutex_);
-  return std::any_of(indexes_.begin(), indexes_.end(),
-                     [](const auto& known) { return known.second.index->HoldsBack(); });
 }
 
 std::shared_ptr<Index> Catalog::FindWithWork() const {

@@ -45,8 +45,8 @@ class Catalog {
   // In the order of the ids.
   std::vector<std::shared_ptr<Index>> All() const;
 
-  // Whether some index holds changes back.
-  bool HoldsBack() const;
+  // Whether there is an index in which the next change is likely to wait for others.
+  bool IsCrowded() const { return crowded_indexes_ > 0; }
 
   // An index that has work to do; null if there is none.
   std::shared_ptr<Index> FindWithWork() const;
@@ -66,6 +66,7 @@ class Catalog {
 
   const Registry registry_;
   CheckProcess& checks_;
+  std::atomic<int> crowded_indexes_ = 0;
   std::string registry_damage_;  // what was wrong with a registry that was set aside
 
   std::mutex change_mutex_;  // held by whatever changes which indexes there are; taken first

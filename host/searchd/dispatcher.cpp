@@ -73,7 +73,7 @@ Json::Value EmptyObject() { return Json::Value(Json::objectValue); }
 // Changes of a document are queued, not carried out, unless too many wait.
 bool Dispatcher::IsQuick(const std::string& request) {
   return request.size() <= kMaxQuickBytes && request.find("\"document_") < kCommandNameWithin &&
-         !catalog_.HoldsBack();
+         !catalog_.IsCrowded();
 }
 
 Answer Dispatcher::Handle(const std::string& request, uid_t client) {

@@ -10,11 +10,12 @@
 
 namespace searchd {
 
-Index::Index(IndexDefinition definition, CheckProcess& process, DatabaseCheck::Files files)
+Index::Index(IndexDefinition definition, CheckProcess& process, DatabaseCheck::Files files,
+             std::atomic<int>& crowded)
     : definition_(std::move(definition)),
       mapping_(Mapping::Parse(definition_.mappings)),
       check_(definition_.path, process, files),
-      writer_(definition_.path, mapping_, LanguageOfIndex(definition_.id), check_) {}
+      writer_(definition_.path, mapping_, LanguageOfIndex(definition_.id), check_, crowded) {}
 
 bool Index::Upsert(const std::string& document_id, Json::Value document, std::size_t bytes) {
   CheckDocument(mapping_, document_id, document);

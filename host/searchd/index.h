@@ -27,8 +27,10 @@ struct IndexDefinition {
 // RequestError(kNoSuchIndex).
 class Index {
  public:
-  // `process` must outlive the object.
-  Index(IndexDefinition definition, CheckProcess& process, DatabaseCheck::Files files);
+  // `crowded` counts the indexes in which the next change is likely to wait until others have taken
+  // place. It and `process` must outlive the object.
+  Index(IndexDefinition definition, CheckProcess& process, DatabaseCheck::Files files,
+        std::atomic<int>& crowded);
 
   const IndexDefinition& Definition() const { return definition_; }
 
@@ -39,9 +41,6 @@ class Index {
   bool Delete(const std::string& document_id);
   void ApplyChanges();
   void Commit();
-
-  // Whether the next change is likely to wait until others have taken place.
-  bool HoldsBack() const { return writer_.HoldsBack(); }
 
   // Whether there is work that later requests need not do if it is done before, and doing it.
   bool HasWork() const;

@@ -20,8 +20,12 @@ constexpr std::size_t kUsualBytes = std::size_t{16} * 1024;  // few changes are 
 }  // namespace
 
 IndexWriter::IndexWriter(std::string path, const Mapping& mapping, const Language& language,
-                         DatabaseCheck& check)
-    : path_(std::move(path)), mapping_(mapping), language_(language), check_(check) {}
+                         DatabaseCheck& check, std::atomic<int>& crowded)
+    : path_(std::move(path)),
+      mapping_(mapping),
+      language_(language),
+      check_(check),
+      crowded_writers_(crowded) {}
 
 bool IndexWriter::Queue(Change change) {
   check_.ThrowIfDamaged();
@@ -34,7 +38,7 @@ bool IndexWriter::Queue(Change change) {
   queued_bytes_ += change.bytes;
   queue_.push_back(std::move(change));
   queued_ = true;
-  holds_back_ = IsFullLocked(kUsualBytes);
+  SetCrowded(IsFullLocked(kUsualBytes));
   busy_ = false;
   return queue_.size() >= kManyQueued;
 }
@@ -111,10 +115,14 @@ bool IndexWriter::IsFullLocked(std::size_t more_bytes) const {
          (!queue_.empty() && queued_bytes_ + more_bytes > kMaxQueuedBytes);
 }
 
+void IndexWriter::SetCrowded(bool crowded) {
+  if (std::exchange(is_crowded_, crowded) != crowded) crowded_writers_ += crowded ? 1 : -1;
+}
+
 std::deque<Change> IndexWriter::TakeQueue() {
   const std::lock_guard lock(queue_mutex_);
   queued_ = false;
-  holds_back_ = false;
+  SetCrowded(false);
   queued_bytes_ = 0;
   return std::exchange(queue_, {});
 }

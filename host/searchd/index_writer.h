@@ -32,15 +32,13 @@ struct Change {
 // nothing is lost: changes wait, and Commit, and Queue when many wait, throw RequestError(kBusy).
 class IndexWriter {
  public:
+  // `crowded` counts the writers whose next Queue is likely to apply what waits.
   IndexWriter(std::string path, const Mapping& mapping, const Language& language,
-              DatabaseCheck& check);
+              DatabaseCheck& check, std::atomic<int>& crowded);
 
   // Returns whether so much is waiting that it should be applied soon. Applies at once when it is
   // so much that clients have to be held back.
   bool Queue(Change change);
-
-  // Whether the next Queue is likely to apply what waits.
-  bool HoldsBack() const { return holds_back_; }
 
   // Applies what is queued, unless another thread is at it.
   void ApplyQueued();
@@ -64,6 +62,7 @@ class IndexWriter {
  private:
   bool IsFull(std::size_t more_bytes);
   bool IsFullLocked(std::size_t more_bytes) const;
+  void SetCrowded(bool crowded);
   std::deque<Change> TakeQueue();
   void ThrowFailure();
   void ApplyQueuedLocked();
@@ -80,10 +79,12 @@ class IndexWriter {
   const Mapping& mapping_;
   const Language language_;
   DatabaseCheck& check_;
+  std::atomic<int>& crowded_writers_;
 
   std::mutex queue_mutex_;
   std::deque<Change> queue_;
   std::size_t queued_bytes_ = 0;
+  bool is_crowded_ = false;
   std::optional<std::string> failure_;
 
   std::mutex write_mutex_;  // taken before queue_mutex_ where both are needed
@@ -96,7 +97,6 @@ class IndexWriter {
   std::set<std::string> new_terms_;  // words and titles that it brings
   bool closed_ = false;
   std::atomic<bool> queued_ = false;
-  std::atomic<bool> holds_back_ = false;
   std::atomic<bool> busy_ = false;  // another process held the index at the last attempt
   std::atomic<bool> unflushed_ = false;
 };

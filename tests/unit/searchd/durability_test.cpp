@@ -3,6 +3,7 @@
 #include <sys/wait.h>
 #include <unistd.h>
 
+#include <atomic>
 #include <cerrno>
 #include <csignal>
 #include <filesystem>
@@ -34,12 +35,13 @@ class DurabilityTest : public test::DeviceRootTest {
  protected:
   std::unique_ptr<Index> MakeIndex() {
     PrepareIndexDirectory(kPath, true);
-    return std::make_unique<Index>(Definition("a"), checks_, DatabaseCheck::Files::kMade);
+    return std::make_unique<Index>(Definition("a"), checks_, DatabaseCheck::Files::kMade, crowded_);
   }
 
   // As the daemon does at its start.
   std::unique_ptr<Index> FindIndex() {
-    return std::make_unique<Index>(Definition("a"), checks_, DatabaseCheck::Files::kFound);
+    return std::make_unique<Index>(Definition("a"), checks_, DatabaseCheck::Files::kFound,
+                                   crowded_);
   }
 
   static void Upsert(Index& index, int documents) {
@@ -80,6 +82,7 @@ class DurabilityTest : public test::DeviceRootTest {
   }
 
   CheckProcess checks_{STDERR_FILENO};
+  std::atomic<int> crowded_ = 0;
 };
 
 TEST_F(DurabilityTest, CommittedChangesAreSynced) {
