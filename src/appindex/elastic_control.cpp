@@ -119,13 +119,14 @@ void SendCommand(const char* command, Json::Value data) {
 
 }  // namespace
 
-void SendRequestImpl(Json::Value& response, const std::string& request_text) {
+void SendRequestImpl(Json::Value& response, const RequestText& request) {
   WaitForSocket();
 
   tovodaemon::DomainSockConnection conn(kElasticdSockPath);
   CheckOrThrow(conn.Connect(kElasticdConnectTimeout), {kModule, 84, "SendRequestImpl"},
                "!conn.Connect(kElasticdConnectTimeout)", Error::kElasticdRequestError,
-               [&] { return "Connect failed, req=" + request_text; });
+               [&] { return "Connect failed, req=" + request(); });
+  const std::string request_text = request();  // while the daemon wakes up
   CheckOrThrow(conn.Send(request_text), {kModule, 86, "SendRequestImpl"},
                "!conn.Send(req.toString())", Error::kElasticdRequestError,
                [&] { return "Send failed, req=" + request_text; });
@@ -140,16 +141,18 @@ void SendRequestImpl(Json::Value& response, const std::string& request_text) {
 }
 
 void SendRequestImpl(Json::Value& response, const Json::Value& request) {
-  SendRequestImpl(response, toString(request));
+  SendRequestImpl(response, [&] { return toString(request); });
 }
 
-void SendRequest(const Json::Value& request) { SendRequest(toString(request)); }
+void SendRequest(const Json::Value& request) {
+  SendRequest([&] { return toString(request); });
+}
 
-void SendRequest(const std::string& request_text) {
+void SendRequest(const RequestText& request) {
   Json::Value response;
   for (;;) {
     try {
-      SendRequestImpl(response, request_text);
+      SendRequestImpl(response, request);
       return;
     } catch (const Error& error) {
       if (!PauseForRetry(error.code)) throw;
@@ -188,7 +191,9 @@ std::string UpsertRequest(const std::string& lang, const Json::Value& doc) {
 }
 
 void IndexUpsert(const std::string& lang, const Json::Value& doc) {
-  SendRequest(UpsertRequest(lang, doc));
+  std::string doc_id;
+  GetStrictString(doc_id, doc, "id", true);  // before anything is sent
+  SendRequest([&] { return UpsertRequest(lang, doc); });
 }
 
 void IndexDelete(const std::string& lang, const std::string& doc_id) {

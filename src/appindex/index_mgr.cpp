@@ -43,10 +43,8 @@ void AddInEveryLanguage(const std::string& conf_path, bool commit) {
   for (const std::string& lang : GetSupportedLangs()) {
     for (const Json::Value& record : descriptor.FindIndexables()) {
       const Json::Value doc = MakeDocument(string_pool, lang, record);
-      // Put together before the pause, which leaves the processor's caches to others.
-      const std::string upsert = elastic::UpsertRequest(lang, doc);
       usleep(kUpsertPauseMicroseconds);
-      elastic::SendRequest(upsert);
+      elastic::IndexUpsert(lang, doc);
     }
     if (commit) elastic::IndexCommit(lang);
   }
