@@ -3,11 +3,13 @@
 #include <unistd.h>
 
 #include <algorithm>
+#include <chrono>
 #include <cstdlib>
 #include <iterator>
 #include <utility>
 
 #include "appindex/elastic_control_internal.h"
+#include "appindex/observer_internal.h"
 #include "appindex/utilities/json_helpers.h"
 #include "common/check.h"
 #include "common/json_strict.h"
@@ -19,14 +21,13 @@ namespace {
 constexpr char kModule[] = "elastic_control";
 constexpr long kElasticdConnectTimeout = 864000;  // ten days, in seconds
 constexpr int kMaxSocketChecks = 16;
-constexpr unsigned kSocketPauseSeconds = 1;
+constexpr std::chrono::seconds kSocketPause(1);
 
 // 609 lies between them and is a real failure.
 constexpr int kDaemonDbNotReady[] = {607, 608, 610};
-constexpr unsigned kNotReadyPauseSeconds = 30;
+constexpr std::chrono::seconds kNotReadyPause(30);
 constexpr int kBusyMinMinutes = 15;
 constexpr int kBusyMinuteSteps = 5;
-constexpr unsigned kSecondsPerMinute = 60;
 
 constexpr char kIndexIdPrefix[] = "appindex_";
 
@@ -54,12 +55,17 @@ constexpr char kAppIndexMappings[] = R"({
   }
 })";
 
+void Pause(Observer::Wait reason, std::chrono::seconds pause) {
+  Tell(&Observer::OnWait, reason, pause);
+  sleep(static_cast<unsigned>(pause.count()));
+}
+
 // Gives up in silence: the connect that follows fails and says so.
 void WaitForSocket() {
   for (int failed = 1; access(kElasticdSockPath, F_OK) != 0 && failed < kMaxSocketChecks;
        ++failed) {
     LogNotice(kModule, 74, "elastic socket is not ready, retry ... " + std::to_string(failed));
-    sleep(kSocketPauseSeconds);
+    Pause(Observer::Wait::kSocket, kSocketPause);
   }
 }
 
@@ -92,12 +98,12 @@ bool PauseForRetry(int code) {
   if (std::count(std::begin(kDaemonDbNotReady), std::end(kDaemonDbNotReady), code) != 0) {
     LogNotice(kModule, 108,
               "DB is not good yet, retry... (Error Code: " + std::to_string(code) + ")");
-    sleep(kNotReadyPauseSeconds);
+    Pause(Observer::Wait::kNotReady, kNotReadyPause);
     return true;
   }
   if (code == Error::kDaemonBusy) {
     LogNotice(kModule, 114, "Retry since tovoelasticd is busy");
-    sleep(static_cast<unsigned>(rand() % kBusyMinuteSteps + kBusyMinMinutes) * kSecondsPerMinute);
+    Pause(Observer::Wait::kBusy, std::chrono::minutes(rand() % kBusyMinuteSteps + kBusyMinMinutes));
     return true;
   }
   return false;

@@ -15,7 +15,6 @@ namespace {
 constexpr unsigned kMaxSearchDepth = 5;
 constexpr char kModuleIdSeparator[] = "?";
 
-const std::set<std::string> kAppRoots = {"/var/packages/", "/usr/tovo/tovoman/webman/modules/"};
 constexpr char kNoApplication[] = "Docuvault";
 
 void LogMalformed(const std::string& conf_path) {

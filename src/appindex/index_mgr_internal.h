@@ -16,6 +16,10 @@ namespace velkor::appindex {
 constexpr char kIndexMgr[] = "index_mgr";  // the module's name in log lines
 constexpr char kIndexConf[] = "index.conf";
 
+// The directories whose entries are the applications.
+inline const std::set<std::string> kAppRoots = {"/var/packages/",
+                                                "/usr/tovo/tovoman/webman/modules/"};
+
 // One descriptor, read as often as it is asked for, since a package may be changed meanwhile. What
 // the file holds is parsed and filtered again only when that is not what it held the last time.
 class Descriptor {

@@ -7,12 +7,13 @@
 #include <cstdio>
 #include <cstring>
 #include <limits>
-#include <map>
 
 #include "appindex/elastic_control_internal.h"
 #include "appindex/error.h"
 #include "appindex/index_mgr.h"
 #include "appindex/index_mgr_internal.h"
+#include "appindex/index_queue_internal.h"
+#include "appindex/observer_internal.h"
 #include "appindex/utilities/file_utils.h"
 #include "appindex/utilities/json_helpers.h"
 #include "appindex/utilities/lock_file.h"
@@ -23,21 +24,10 @@
 namespace velkor::appindex {
 namespace {
 
-constexpr char kProcessLockPath[] = "/tmp/velkor_appindex_process.lck";
-constexpr char kQueuePath[] = "/var/packages/Velkor/etc/appindex.queue";
-
-// The numbers stand in the file.
-enum Operation { kAdd = 1, kDel = 2, kReindex = 3 };
-
-// By descriptor path. A std::map keeps its keys in byte order, and the requests without a path,
-// rebuilds as a rule, come first.
-using Batch = std::map<std::string, int>;
-
 // Moves the live queue aside, while no writer is in the middle of a line.
-void TakeQueue(const std::string& queue_path, const std::string& queue_path_tmp) {
-  const LockFile queue_lock(queue_path, true);
-  CheckOrThrow(rename(queue_path.c_str(), queue_path_tmp.c_str()) == 0,
-               {kIndexMgr, 330, "ProcessQueue"},
+void TakeQueue() {
+  const LockFile queue_lock(kQueuePath, true);
+  CheckOrThrow(rename(kQueuePath, kBatchPath) == 0, {kIndexMgr, 330, "ProcessQueue"},
                "0 > rename(queue_path.c_str(), queue_path_tmp.c_str())", Error::kGeneralError,
                [] { return std::string("rename failed, reason=") + std::strerror(errno); });
 }
@@ -68,21 +58,6 @@ void ReadLine(Batch& batch, const std::string& line) {
   }
 }
 
-Batch ReadBatch(const std::string& queue_path_tmp) {
-  std::string text;
-  CheckOrThrow(
-      ReadRegularFile(queue_path_tmp, std::numeric_limits<std::size_t>::max(), text),
-      {kIndexMgr, 340, "ProcessQueue"}, "!input_stream", Error::kGeneralError,
-      [] { return std::string("Failed to open appindex queue, reason=") + std::strerror(errno); });
-  Batch batch;
-  for (std::size_t begin = 0; begin < text.size();) {
-    const std::size_t end = std::min(text.find('\n', begin), text.size());
-    ReadLine(batch, text.substr(begin, end - begin));
-    begin = end + 1;
-  }
-  return batch;
-}
-
 void Perform(int op, const std::string& path) {
   switch (op) {
     case kAdd:
@@ -96,24 +71,43 @@ void Perform(int op, const std::string& path) {
   }
 }
 
+void PerformAll(const Batch& batch) {
+  std::size_t number = 0;
+  for (const auto& [path, op] : batch) {
+    Tell(&Observer::OnRequest, ++number, batch.size());
+    Perform(op, path);
+  }
+}
+
 }  // namespace
+
+Batch ReadBatch(const std::string& path) {
+  std::string text;
+  CheckOrThrow(
+      ReadRegularFile(path, std::numeric_limits<std::size_t>::max(), text),
+      {kIndexMgr, 340, "ProcessQueue"}, "!input_stream", Error::kGeneralError,
+      [] { return std::string("Failed to open appindex queue, reason=") + std::strerror(errno); });
+  Batch batch;
+  for (std::size_t begin = 0; begin < text.size();) {
+    const std::size_t end = std::min(text.find('\n', begin), text.size());
+    ReadLine(batch, text.substr(begin, end - begin));
+    begin = end + 1;
+  }
+  return batch;
+}
 
 void ProcessQueue() {
   const LockFile process_lock(kProcessLockPath, true);
-  const std::string queue_path = kQueuePath;
-  const std::string queue_path_tmp = queue_path + ".tmp";
-  while (IsFileExist(queue_path) || IsFileExist(queue_path_tmp)) {
+  while (IsFileExist(kQueuePath) || IsFileExist(kBatchPath)) {
     if (access(elastic::kElasticdSockPath, F_OK) != 0) return;  // no daemon: for a later call
 
     // A batch that an earlier call left unfinished comes first.
-    if (IsFileExist(queue_path) && !IsFileExist(queue_path_tmp)) {
-      TakeQueue(queue_path, queue_path_tmp);
-    }
-    if (!IsFileExist(queue_path_tmp)) return;
-    for (const auto& [path, op] : ReadBatch(queue_path_tmp)) Perform(op, path);
+    if (IsFileExist(kQueuePath) && !IsFileExist(kBatchPath)) TakeQueue();
+    if (!IsFileExist(kBatchPath)) return;
+    PerformAll(ReadBatch(kBatchPath));
 
     // Only now: until here the batch file is the record of what is not done yet.
-    unlink(queue_path_tmp.c_str());
+    unlink(kBatchPath);
   }
 }
 

@@ -1,4 +1,5 @@
 #include <boost/regex.hpp>
+#include <utility>
 
 #include "appindex/device_identity.h"
 #include "appindex/utils_internal.h"
@@ -19,6 +20,8 @@ const std::set<std::string> kSupportedLangs = {"enu", "cht", "chs", "csy", "jpn"
 
 std::string platform;
 std::string model;
+std::optional<std::string> assumed_platform;
+std::optional<std::string> assumed_model;
 
 bool IsListed(const Json::Value& filter, const char* member, const std::string& name) {
   const Json::Value& names = filter[member];
@@ -48,14 +51,27 @@ void PrepareModelAndPlatform() {
   model = sm[2];
 }
 
+AssumedDevice::AssumedDevice(std::optional<std::string> model_name,
+                             std::optional<std::string> platform_name) {
+  assumed_model = std::move(model_name);
+  assumed_platform = std::move(platform_name);
+}
+
+AssumedDevice::~AssumedDevice() {
+  assumed_model.reset();
+  assumed_platform.reset();
+}
+
 const std::set<std::string>& GetSupportedLangs() { return kSupportedLangs; }
 
 const std::string& GetPlatform() {
+  if (assumed_platform) return *assumed_platform;
   if (platform.empty()) PrepareModelAndPlatform();
   return platform;
 }
 
 const std::string& GetModel() {
+  if (assumed_model) return *assumed_model;
   if (model.empty()) PrepareModelAndPlatform();
   return model;
 }

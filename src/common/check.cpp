@@ -8,7 +8,10 @@
 namespace velkor {
 namespace {
 
+thread_local int muted = 0;
+
 void WriteLine(const CheckSite& site, int failed_with, const std::string& text) {
+  if (muted > 0) return;
   const std::string suffix =
       failed_with == 0 ? "" : " [err: " + std::string(std::strerror(failed_with)) + "]";
   syslog(LOG_ERR, "%s:%d (%d, %u) (%s) %s%s", site.module, site.line, getpid(), geteuid(),
@@ -19,6 +22,13 @@ void WriteLine(const CheckSite& site, int failed_with, const std::string& text) 
 std::string FailedText(const char* condition) { return "Failed [" + std::string(condition) + "]"; }
 
 }  // namespace
+
+MutedLog::MutedLog() : kept_errno_(errno) { ++muted; }
+
+MutedLog::~MutedLog() {
+  --muted;
+  errno = kept_errno_;
+}
 
 void LogFailureText(const CheckSite& site, const std::string& text) {
   WriteLine(site, errno, text);
@@ -31,6 +41,7 @@ void LogFailure(bool ok, const CheckSite& site, const char* condition) {
 }
 
 void LogNotice(const char* module, int line, const std::string& text) {
+  if (muted > 0) return;
   const int kept = errno;
   syslog(LOG_ERR, "%s:%d %s", module, line, text.c_str());
   errno = kept;

@@ -4,7 +4,7 @@
 // TEXT]", the text of errno, when errno is set, and errno is 0 after it. A stale errno of an
 // earlier harmless call therefore shows in the next failure line; that is the convention.
 //
-// None of these functions blocks on more than syslog(3), takes a lock or keeps state.
+// None of these functions blocks on more than syslog(3) or takes a lock.
 #pragma once
 
 #include <cerrno>
@@ -20,6 +20,19 @@ struct CheckSite {
   const char* module;
   int line;
   const char* function;
+};
+
+// While one exists, the thread that made it writes no lines; errno is afterwards what it was
+// before. For looking ahead at what is read, and reported, again later.
+class MutedLog {
+ public:
+  MutedLog();
+  ~MutedLog();
+  MutedLog(const MutedLog&) = delete;
+  MutedLog& operator=(const MutedLog&) = delete;
+
+ private:
+  const int kept_errno_;
 };
 
 // "MODULE:LINE (PID, EUID) (FUNCTION) TEXT"

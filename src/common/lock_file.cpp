@@ -6,20 +6,30 @@
 #include <unistd.h>
 
 #include <cerrno>
+#include <chrono>
 #include <cstring>
 
 #include "common/check.h"
+#include "common/lock_pause.h"
 
 namespace velkor {
 namespace {
 
 constexpr int kMaxAttempts = 64;
 constexpr int kPauseSteps = 10;
-constexpr useconds_t kPauseStepMicroseconds = 100000;
+constexpr std::chrono::milliseconds kPauseStep(100);
 
 bool IsHeldElsewhere(int error) { return error == EINTR || error == EWOULDBLOCK; }
 
+void Pause() {
+  const std::chrono::milliseconds pause = (rand() % kPauseSteps) * kPauseStep;
+  if (on_lock_pause != nullptr) on_lock_pause(pause);
+  usleep(static_cast<useconds_t>(std::chrono::microseconds(pause).count()));
+}
+
 }  // namespace
+
+void (*on_lock_pause)(std::chrono::milliseconds pause) = nullptr;
 
 LockFile::LockFile(const std::string& path, bool exclusive) : fd_(-1), path_(path) {
   const int operation = (exclusive ? LOCK_EX : LOCK_SH) | LOCK_NB;
@@ -35,7 +45,7 @@ LockFile::LockFile(const std::string& path, bool exclusive) : fd_(-1), path_(pat
 
     close(fd_);
     fd_ = -1;
-    usleep(static_cast<useconds_t>(rand() % kPauseSteps) * kPauseStepMicroseconds);
+    Pause();
   }
   throw Error(Error::kLockFileError, "Exceed max retry, path=" + path_);
 }

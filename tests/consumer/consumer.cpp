@@ -5,6 +5,7 @@
 #include <appindex/elastic_control.h>
 #include <appindex/error.h>
 #include <appindex/index_mgr.h>
+#include <appindex/observer.h>
 #include <appindex/string_pool.h>
 #include <appindex/utilities.h>
 
@@ -63,10 +64,37 @@ void CheckValues() {
   Expect(!mutex.TryLock(), "a mutex that is held");
 }
 
+class Waits : public velkor::appindex::Observer {
+ public:
+  Waits() { velkor::appindex::SetObserver(this); }
+  ~Waits() override { velkor::appindex::SetObserver(nullptr); }
+  int count = 0;
+
+ private:
+  void OnRequest(std::size_t, std::size_t) override {}
+  void OnWork(std::size_t) override {}
+  void OnDocument(const std::string&, const std::string&) override {}
+  void OnWait(Wait reason, std::chrono::milliseconds) override {
+    if (reason == Wait::kLock && ++count == 1) throw 1;  // enough of waiting
+  }
+};
+
+void CheckObserver(const std::string& lock_path) {
+  const velkor::LockFile held(lock_path, true);
+  Waits waits;
+  try {
+    const velkor::LockFile second(lock_path, true);
+    Expect(false, "a lock that is held is waited for");
+  } catch (int) {
+    Expect(waits.count == 1, "the observer is told of the wait, and may end it");
+  }
+}
+
 }  // namespace
 
-int main() {
+int main(int, char** argv) {
   CheckErrors();
   CheckValues();
+  CheckObserver(argv[0]);  // any file that this may read
   return failures == 0 ? 0 : 1;
 }
