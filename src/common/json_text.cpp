@@ -29,6 +29,18 @@ std::unique_ptr<Json::CharReader> MakeStrictReader() {
   return std::unique_ptr<Json::CharReader>(builder.newCharReader());
 }
 
+// The reader passes over comments in some places even when they are not allowed. Outside of its
+// strings no JSON text has a slash.
+bool HasComment(const std::string& text) {
+  bool in_string = false;
+  for (std::size_t i = 0; i < text.size(); ++i) {
+    if (text[i] == '"') in_string = !in_string;
+    if (text[i] == '\\' && in_string) ++i;
+    if (text[i] == '/' && !in_string) return true;
+  }
+  return false;
+}
+
 void AppendEscaped(std::string& out, char c) {
   switch (c) {
     case '"':
@@ -154,7 +166,7 @@ void AppendValue(std::string& out, const Json::Value& value) {
 
 bool fromString(Json::Value& value, const std::string& text) {
   // The reader takes a NUL for the end of the text and would accept anything behind it.
-  if (text.find('\0') != std::string::npos) return false;
+  if (text.find('\0') != std::string::npos || HasComment(text)) return false;
   // Making a reader costs more than most texts; each parse begins afresh.
   thread_local const std::unique_ptr<Json::CharReader> reader = MakeStrictReader();
   Json::Value parsed;

@@ -74,9 +74,18 @@ TEST(FromStringTest, RefusesATextWithoutAValue) {
   EXPECT_FALSE(IsJson(" \n"));
 }
 
+TEST(FromStringTest, TakesSlashesInStrings) {
+  EXPECT_TRUE(IsJson(R"({"a//b":"/* c */","c\"/*d":"\\"})"));
+}
+
 TEST(FromStringTest, RefusesComments) {
   EXPECT_FALSE(IsJson("/* c */ {}"));
   EXPECT_FALSE(IsJson("{} // c"));
+  for (const char* text :
+       {"{ // c\n}", "{ /* c */ \"a\":1}", "{\"a\":1 /* c */}", "{\"a\" /* c */:1}",
+        "{\"a\": /* c */ 1}", "[ /* c */ ]", "[1 /* c */]", "[1, // c\n2]"}) {
+    EXPECT_FALSE(IsJson(text)) << text;
+  }
   EXPECT_FALSE(IsJson("{} /* c */"));
   EXPECT_FALSE(IsJson("[1, // c\n 2]"));
 }
