@@ -28,8 +28,7 @@ void Worths::Clear() {
 }
 
 Matcher::Matcher(const Xapian::Database& database)
-    : database_(database),
-      postings_(database),
+    : postings_(database),
       plan_(database.get_lastdocid() + 1),
       reading_(database.get_lastdocid() + 1),
       clause_(database.get_lastdocid() + 1),

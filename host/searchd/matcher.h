@@ -52,7 +52,6 @@ class Matcher {
   void RaiseByView(const View& view);
   std::vector<Hit> TakeHits();
 
-  const Xapian::Database& database_;
   PostingReader postings_;
   Worths plan_;
   Worths reading_;

@@ -98,7 +98,8 @@ SearchResult Searcher::Search(const Xapian::Database& database, const SearchRequ
   const Xapian::Document first = database.get_document(page.front().document);
   result.matched = NameOfStep(AssessDocument(plan, first).how);
   page.resize(std::min(page.size(), end));
-  page.erase(page.begin(), page.begin() + std::min<std::ptrdiff_t>(request.offset, page.size()));
+  const std::size_t before = std::min<std::size_t>(request.offset, page.size());
+  page.erase(page.begin(), page.begin() + static_cast<std::ptrdiff_t>(before));
   result.hits = HitTexts(database, page, plan, request.explain);
   return result;
 }
