@@ -1,0 +1,76 @@
+#include "tool/descriptor_path.h"
+
+#include <cerrno>
+#include <cstring>
+#include <filesystem>
+
+#include "appindex/error.h"
+#include "appindex/index_mgr_internal.h"
+#include "appindex/utilities/file_utils.h"
+#include "appindex/utilities/json_helpers.h"
+#include "common/check.h"
+#include "tool/failure.h"
+
+namespace tool {
+namespace {
+
+namespace index = velkor::appindex;
+
+std::string Absolute(const std::string& argument) {
+  std::string path = std::filesystem::absolute(argument).lexically_normal().string();
+  while (path.size() > 1 && path.back() == '/') path.pop_back();
+  return path;
+}
+
+bool IsInApplication(const std::string& path) {
+  for (const std::string& root : index::kAppRoots) {
+    // Below the root there is the application's directory, and the descriptor in it.
+    if (velkor::StringStartWith(path, root) && path.find('/', root.size()) != std::string::npos) {
+      return true;
+    }
+  }
+  return false;
+}
+
+std::string FindIn(const std::string& dir) {
+  const velkor::MutedLog muted;
+  std::string conf_path;
+  if (!index::FindIndexConfByAppRoot(conf_path, dir + "/", 0)) {
+    throw Failure(dir + ": there is no index.conf in it, nor up to five levels below");
+  }
+  return conf_path;
+}
+
+}  // namespace
+
+std::string DescriptorPath(const std::string& argument) {
+  std::string path = Absolute(argument);
+  if (velkor::IsDirExist(path + "/", false)) path = FindIn(path);
+  if (velkor::Basename(path) != index::kIndexConf) {
+    throw Failure(path + ": a descriptor is named index.conf; others are not read");
+  }
+  if (!IsInApplication(path)) {
+    throw Failure(path + ": not in a directory of /var/packages or " +
+                  "/usr/tovo/tovoman/webman/modules, where applications are");
+  }
+  if (!velkor::IsFileExist(velkor::RealPath(path))) {
+    throw Failure(path + ": there is no such file");
+  }
+  return path;
+}
+
+std::vector<std::string> DescriptorPaths(const std::vector<std::string>& arguments) {
+  std::vector<std::string> paths;
+  for (const std::string& argument : arguments) paths.push_back(DescriptorPath(argument));
+  return paths;
+}
+
+std::string WhyUnreadable(const std::string& conf_path) {
+  Json::Value root;
+  errno = 0;
+  if (velkor::fromFile(root, conf_path)) return "";
+  if (errno != 0) return std::string("cannot be read: ") + std::strerror(errno);
+  return "not strict JSON; `appindex lint` shows where";
+}
+
+}  // namespace tool

@@ -1,0 +1,60 @@
+// The state of everything around the index, gathered and shown.
+#pragma once
+
+#include <json/value.h>
+
+#include <map>
+#include <string>
+#include <vector>
+
+#include "tool/lock_holders.h"
+#include "tool/queue_state.h"
+
+namespace tool {
+
+struct Version {
+  std::string recorded;  // empty: the index was never rebuilt
+  std::string current;
+  std::string problem;  // why one of them is not known; empty: both are
+  bool Differs() const { return problem.empty() && recorded != current; }
+};
+
+struct Index {
+  enum State { kWhole, kMissing, kDamaged };
+  State state = kMissing;
+  unsigned long long documents = 0;
+  std::string damage;
+};
+
+struct Lock {
+  std::string path;
+  std::vector<LockHolder> holders;
+};
+
+struct Status {
+  std::string daemon_problem;  // empty: the search daemon answers
+  RequestFile batch;
+  RequestFile queue;
+  std::vector<Step> order;  // points to `batch` and `queue`
+  std::vector<Lock> locks;
+  Version version;
+  std::map<std::string, Index> indexes;  // by language; empty when the daemon does not answer
+
+  // Whether there are as many documents in each language, as there are when nothing was
+  // interrupted.
+  bool IsEven() const;
+
+  Status() = default;
+  Status(const Status&) = delete;
+  Status& operator=(const Status&) = delete;
+};
+
+// Fills `status` with what is so now. Never fails for what it finds.
+void Gather(Status& status, int proc);
+
+Json::Value ToJson(const Status& status);
+
+// For a reader, in at most 80 columns but for long paths.
+std::string ToText(const Status& status);
+
+}  // namespace tool
