@@ -23,3 +23,13 @@ file(RELATIVE_PATH TEISEIGATRO_PC_TO_PREFIX "/${CMAKE_INSTALL_LIBDIR}/pkgconfig"
 configure_file(${PROJECT_SOURCE_DIR}/cmake/teiseigatro.pc.in
                ${PROJECT_BINARY_DIR}/teiseigatro.pc @ONLY)
 install(FILES ${PROJECT_BINARY_DIR}/teiseigatro.pc DESTINATION ${CMAKE_INSTALL_LIBDIR}/pkgconfig)
+
+add_subdirectory(man)
+if(TEISEIGATRO_DEVICE STREQUAL "host")  # whose daemon and command these are about
+  add_subdirectory(completions)
+  add_subdirectory(systemd)
+endif()
+
+# What editors and other validators read of descriptors.
+install(FILES ${PROJECT_SOURCE_DIR}/schema/index.conf.schema.json
+        DESTINATION ${CMAKE_INSTALL_DATADIR}/teiseigatro)
