@@ -81,6 +81,10 @@ void CheckPaths(Context& context, const LintArguments& arguments) {
 }
 
 void RunLint(Context& context, const LintArguments& arguments) {
+  const bool checks = !arguments.list_tags && arguments.explained_tag.empty();
+  if (!checks && !arguments.paths.empty()) {
+    throw CLI::ExcludesError("PATH", "--explain and --list-tags");
+  }
   if (arguments.list_tags) {
     ListTags(context);
   } else if (!arguments.explained_tag.empty()) {
@@ -95,9 +99,8 @@ void RunLint(Context& context, const LintArguments& arguments) {
 void AddLintCommand(CLI::App& app, Context& context) {
   const auto arguments = std::make_shared<LintArguments>();
   CLI::App* command = app.add_subcommand("lint", "Check descriptors and their texts");
-  CLI::Option* paths =
-      command->add_option("PATH", arguments->paths,
-                          "A descriptor, a package's directory, or a tree of installed packages");
+  command->add_option("PATH", arguments->paths,
+                      "A descriptor, a package's directory, or a tree of installed packages");
   command
       ->add_option("--package", arguments->package_dir,
                    "Where the package begins: what will be a directory in /var/packages")
@@ -110,10 +113,8 @@ void AddLintCommand(CLI::App& app, Context& context) {
       ->check(CLI::IsMember({"text", "github"}));
   command->add_flag("--strict", arguments->strict, "Let warnings count as errors do");
   command->add_option("--explain", arguments->explained_tag, "Tell more about a kind of finding")
-      ->type_name("TAG")
-      ->excludes(paths);
-  command->add_flag("--list-tags", arguments->list_tags, "List the kinds of findings")
-      ->excludes(paths);
+      ->type_name("TAG");
+  command->add_flag("--list-tags", arguments->list_tags, "List the kinds of findings");
   command->callback([&context, arguments] { RunLint(context, *arguments); });
 }
 

@@ -43,7 +43,8 @@ std::unique_ptr<icu::RuleBasedCollator> Letters() {
   if (U_FAILURE(status) != 0) return nullptr;
   collator->setStrength(icu::Collator::PRIMARY);
   auto* rules = dynamic_cast<icu::RuleBasedCollator*>(collator.get());
-  if (rules != nullptr) collator.release();
+  if (rules == nullptr) return nullptr;
+  static_cast<void>(collator.release());
   return std::unique_ptr<icu::RuleBasedCollator>(rules);
 }
 

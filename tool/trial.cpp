@@ -38,7 +38,7 @@ std::string ProblemOf(int op, const std::string& conf_path) {
   const velkor::MutedLog muted;
   try {
     if (velkor::Basename(conf_path) != index::kIndexConf) return "does nothing: not an index.conf";
-    const std::string unreadable = WhyUnreadable(conf_path);
+    std::string unreadable = WhyUnreadable(conf_path);
     if (!unreadable.empty()) return unreadable;
     op == index::kAdd ? TryAdd(conf_path) : TryDel(conf_path);
     return "";
