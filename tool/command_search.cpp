@@ -3,6 +3,7 @@
 #include <unistd.h>
 
 #include <cstdio>
+#include <cstring>
 #include <iomanip>
 #include <iostream>
 #include <memory>
@@ -15,12 +16,14 @@
 #include "tool/emphasis.h"
 #include "tool/languages.h"
 #include "tool/output.h"
+#include "tool/wrap.h"
 
 namespace tool {
 namespace {
 
 constexpr int kUsualLimit = 10;
 constexpr int kHighestLimit = 1000;  // the daemon's
+constexpr char kIndent[] = "     ";  // of what stands below a title
 
 struct Options {
   std::string lang;
@@ -59,7 +62,7 @@ std::string Number(double value) {
 }
 
 void PrintExplanation(const Json::Value& hit, bool styled) {
-  std::string text = "     score " + Number(hit["score"].asDouble()) + ":";
+  std::string text = kIndent + ("score " + Number(hit["score"].asDouble()) + ":");
   const char* separator = " ";
   for (const Json::Value& part : hit["explain"]) {
     text +=
@@ -70,15 +73,25 @@ void PrintExplanation(const Json::Value& hit, bool styled) {
   std::cout << Styled(text, Look::kFaint, styled) << "\n";
 }
 
+void PrintDescription(const std::string& text, const std::string& query, bool styled) {
+  if (text.empty()) return;
+  const bool wrap = IsTerminal(STDOUT_FILENO);
+  const std::size_t indent = std::strlen(kIndent);
+  const auto columns = static_cast<std::size_t>(TerminalWidth(STDOUT_FILENO));
+  const std::vector<std::string> lines =
+      wrap ? Wrapped(text, columns > indent ? columns - indent : 1)
+           : std::vector<std::string>{text};
+  for (const std::string& line : lines) {
+    std::cout << kIndent << (styled ? Emphasised(line, query) : line) << "\n";
+  }
+}
+
 void PrintHit(const Json::Value& hit, Json::ArrayIndex number, const std::string& query,
               bool styled) {
-  const auto show = [&](const char* member) {
-    const std::string text = hit[member].asString();
-    return styled ? Emphasised(text, query) : text;
-  };
-  std::cout << std::setw(3) << number << ". " << show("title") << "  "
+  const std::string title = hit["title"].asString();
+  std::cout << std::setw(3) << number << ". " << (styled ? Emphasised(title, query) : title) << "  "
             << Styled("(" + hit["id"].asString() + ")", Look::kFaint, styled) << "\n";
-  if (!hit["desc"].asString().empty()) std::cout << "     " << show("desc") << "\n";
+  PrintDescription(hit["desc"].asString(), query, styled);
   if (hit.isMember("explain")) PrintExplanation(hit, styled);
 }
 
