@@ -36,16 +36,13 @@ std::vector<icu::UnicodeString> Words(const icu::UnicodeString& query) {
 }
 
 // Compares letters and nothing else: the collation order's first level.
-std::unique_ptr<icu::RuleBasedCollator> Letters() {
+std::unique_ptr<icu::Collator> Letters() {
   UErrorCode status = U_ZERO_ERROR;
   std::unique_ptr<icu::Collator> collator(
       icu::Collator::createInstance(icu::Locale::getRoot(), status));
   if (U_FAILURE(status) != 0) return nullptr;
   collator->setStrength(icu::Collator::PRIMARY);
-  auto* rules = dynamic_cast<icu::RuleBasedCollator*>(collator.get());
-  if (rules == nullptr) return nullptr;
-  static_cast<void>(collator.release());
-  return std::unique_ptr<icu::RuleBasedCollator>(rules);
+  return collator;
 }
 
 std::vector<Part> Find(const icu::UnicodeString& text, const icu::UnicodeString& word,
@@ -69,7 +66,8 @@ bool BeginsWord(const icu::UnicodeString& text, int at) {
 std::vector<Part> Places(const icu::UnicodeString& text, const icu::UnicodeString& query) {
   std::vector<Part> inside;
   std::vector<Part> beginnings;
-  const auto letters = Letters();
+  const std::unique_ptr<icu::Collator> collator = Letters();
+  auto* letters = dynamic_cast<icu::RuleBasedCollator*>(collator.get());  // which others are not
   if (letters == nullptr) return beginnings;
   for (const icu::UnicodeString& word : Words(query)) {
     for (const Part& part : Find(text, word, *letters)) {
