@@ -1,4 +1,5 @@
 // Leaving requests for whoever works the queue.
+#include <CLI/CLI.hpp>
 #include <memory>
 #include <string>
 #include <vector>

@@ -2,6 +2,7 @@
 #include <json/value.h>
 #include <unistd.h>
 
+#include <CLI/CLI.hpp>
 #include <chrono>
 #include <cstdio>
 #include <exception>

@@ -1,6 +1,7 @@
 // appindex lint: tells the author of a package what is wrong with it.
 #include <unistd.h>
 
+#include <CLI/CLI.hpp>
 #include <iostream>
 #include <memory>
 #include <string>

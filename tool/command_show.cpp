@@ -1,6 +1,7 @@
 // appindex show: what a descriptor gives, before anything is sent.
 #include <unistd.h>
 
+#include <CLI/CLI.hpp>
 #include <cstring>
 #include <iostream>
 #include <memory>

@@ -1,4 +1,5 @@
 // Telling an operator how things stand.
+#include <CLI/CLI.hpp>
 #include <iostream>
 
 #include "tool/context.h"

@@ -1,8 +1,11 @@
 // What every command of appindex is given.
 #pragma once
 
-#include <CLI/CLI.hpp>
 #include <string>
+
+namespace CLI {
+class App;
+}
 
 namespace tool {
 

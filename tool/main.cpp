@@ -1,6 +1,7 @@
 // The program appindex: the index of the installed applications, from the command line.
 #include <fcntl.h>
 
+#include <CLI/CLI.hpp>
 #include <exception>
 #include <iostream>
 
