@@ -37,17 +37,21 @@ std::string_view WithoutByteOrderMark(std::string_view content) {
 Json::Value ParseStrings(std::string_view rest) {
   Json::Value texts;
   std::string section;
+  Json::Value* section_texts = nullptr;  // once it has one
   while (!rest.empty()) {
     const std::string_view line = sdk::TakeLine(rest);
     if (line.empty() || kCommentMarks.find(line.front()) != std::string_view::npos) continue;
     if (IsSectionHeader(line)) {
       section = line.substr(1, line.size() - 2);
+      section_texts = nullptr;
       continue;
     }
     const std::optional<sdk::Assignment> split = sdk::SplitAssignment(line);
     if (section.empty() || !split || split->value.empty() || split->value.front() != '"') continue;
     const std::optional<std::string> text = sdk::Unquote(split->value, {Unescape, kCommentMarks});
-    if (text) texts[section][std::string(split->key)] = *text;
+    if (!text) continue;
+    if (section_texts == nullptr) section_texts = &texts[section];
+    (*section_texts)[std::string(split->key)] = *text;
   }
   return texts;
 }
