@@ -2,7 +2,6 @@
 
 #include <algorithm>
 #include <utility>
-#include <vector>
 
 #include "host/searchd/terms.h"
 
@@ -37,15 +36,6 @@ double WorthIn(const DocumentTerms& terms, const Way& way) {
   return worth * way.worth / static_cast<double>(way.matches.size());
 }
 
-Json::Value Reason(const std::string& text, const Way& way, double worth) {
-  Json::Value reason(Json::objectValue);
-  reason["text"] = text;
-  reason["member"] = way.member;
-  reason["found"] = NameOf(way.how);
-  reason["worth"] = worth;
-  return reason;
-}
-
 // The best of some ways to find a text.
 Assessment AssessWays(const std::string& text, const std::vector<Way>& ways,
                       bool (*counts)(Role role), const DocumentTerms& terms) {
@@ -53,11 +43,7 @@ Assessment AssessWays(const std::string& text, const std::vector<Way>& ways,
   for (const Way& way : ways) {
     if (!counts(way.role)) continue;
     const double worth = WorthIn(terms, way);
-    if (worth <= best.worth) continue;
-    best.worth = worth;
-    best.how = way.how;
-    best.reasons = Json::Value(Json::arrayValue);
-    best.reasons.append(Reason(text, way, worth));
+    if (worth > best.worth) best = {worth, way.how, {{&text, &way, worth}}};
   }
   return best;
 }
@@ -69,13 +55,25 @@ Assessment AssessView(const View& view, const DocumentTerms& terms) {
     if (best.worth == 0 && !clause.optional) return {};
     sum.worth += best.worth;
     sum.how = std::max(sum.how, best.how);
-    for (const Json::Value& reason : best.reasons) sum.reasons.append(reason);
+    sum.findings.insert(sum.findings.end(), best.findings.begin(), best.findings.end());
   }
   sum.worth *= view.factor / static_cast<double>(view.reading->size());
   return sum;
 }
 
 }  // namespace
+
+Json::Value Assessment::Reasons() const {
+  Json::Value reasons(Json::arrayValue);
+  for (const Finding& finding : findings) {
+    Json::Value& reason = reasons.append(Json::Value(Json::objectValue));
+    reason["text"] = *finding.text;
+    reason["member"] = finding.way->member;
+    reason["found"] = NameOf(finding.way->how);
+    reason["worth"] = finding.worth;
+  }
+  return reasons;
+}
 
 Assessment Assess(const Plan& plan, const DocumentTerms& terms) {
   Assessment best = AssessWays(plan.text, plan.whole, IsAny, terms);

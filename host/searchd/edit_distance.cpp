@@ -48,14 +48,14 @@ bool BeginsWithinOneEdit(View text, View typed) {
   return at == typed.size() || BeginsAfterEdit(text, typed, at);
 }
 
-bool ContainsWithinOneEdit(View text, View typed) {
-  // One edit leaves what stands before the middle letter as it is, or what stands behind it. Most
-  // texts hold neither.
+bool MayContainWithinOneEdit(View text, View typed) {
+  // One edit leaves what stands before the middle letter as it is, or what stands behind it.
   const std::size_t middle = typed.size() / 2;
-  if (text.find(typed.substr(0, middle)) == View::npos &&
-      text.find(typed.substr(std::min(middle + 1, typed.size()))) == View::npos) {
-    return false;
-  }
+  return text.find(typed.substr(0, middle)) != View::npos ||
+         text.find(typed.substr(std::min(middle + 1, typed.size()))) != View::npos;
+}
+
+bool ContainsWithinOneEdit(View text, View typed) {
   for (std::size_t start = 0; start < text.size(); ++start) {
     if (BeginsWithinOneEdit(text.substr(start), typed)) return true;
   }

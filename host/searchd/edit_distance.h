@@ -12,4 +12,7 @@ bool IsWithinOneEdit(std::u32string_view a, std::u32string_view b);
 bool BeginsWithinOneEdit(std::u32string_view text, std::u32string_view typed);
 bool ContainsWithinOneEdit(std::u32string_view text, std::u32string_view typed);
 
+// False only where none of the above holds, and quick to say so.
+bool MayContainWithinOneEdit(std::u32string_view text, std::u32string_view typed);
+
 }  // namespace searchd

@@ -26,33 +26,26 @@ class Typed {
                                                                   : kLettersForTypo;
   }
 
-  // What this text is, begins or is in: as it is, or but for one edit.
-  Vocabulary::Wanted Begun() const {
-    return {letters_, false, [this](const std::u32string& text) {
-              return text.compare(0, letters_.size(), letters_) == 0;
-            }};
+  bool Begins(const std::u32string& text) const {
+    return text.compare(0, letters_.size(), letters_) == 0;
   }
-  Vocabulary::Wanted Holding() const {
-    return {letters_, false, [this](const std::u32string& text) {
-              return text.find(letters_) != std::u32string::npos;
-            }};
+  bool IsIn(const std::u32string& text) const {
+    return text.find(letters_) != std::u32string::npos;
   }
-  Vocabulary::Wanted Near() const {
-    return {letters_, true, [this](const std::u32string& text) {
-              return letters_.size() + 1 >= least_ && text.size() >= least_ &&
-                     IsWithinOneEdit(text, letters_);
-            }};
+  // The same but for one edit.
+  bool IsNearly(const std::u32string& text) const {
+    return letters_.size() + 1 >= least_ && text.size() >= least_ &&
+           IsWithinOneEdit(text, letters_);
   }
-  Vocabulary::Wanted NearlyBegun() const {
-    return {letters_, true, [this](const std::u32string& text) {
-              return letters_.size() >= least_ && BeginsWithinOneEdit(text, letters_);
-            }};
+  bool NearlyBegins(const std::u32string& text) const {
+    return letters_.size() >= least_ && BeginsWithinOneEdit(text, letters_);
   }
-  Vocabulary::Wanted NearlyHolding() const {
-    return {letters_, true, [this](const std::u32string& text) {
-              return letters_.size() >= least_ && ContainsWithinOneEdit(text, letters_);
-            }};
+  bool MayBeIn(const std::u32string& text) const { return MayContainWithinOneEdit(text, letters_); }
+  bool IsNearlyIn(const std::u32string& text) const {
+    return letters_.size() >= least_ && ContainsWithinOneEdit(text, letters_);
   }
+
+  const std::u32string& GetLetters() const { return letters_; }
 
  private:
   std::u32string letters_;
@@ -71,11 +64,14 @@ bool HasWords(const Field& field) {
   return !field.rule.ngram && field.rule.analyzer != AnalyzerKind::kKeyword;
 }
 
-void AddWays(std::vector<Way>& ways, const Field& field, How how, double worth, bool beginning,
-             const std::vector<std::string>& terms) {
-  if (worth <= 0) return;
-  for (const std::string& term : terms) {
-    ways.push_back({field.member, field.role, how, worth, {{term, beginning}}});
+void AddWay(std::vector<Way>& ways, const Field& field, How how, double worth, Match match) {
+  if (worth > 0) ways.push_back({field.member, field.role, how, worth, {std::move(match)}});
+}
+
+void AddWays(std::vector<Way>& ways, const Field& field, How how,
+             const std::vector<Vocabulary::Found>& found) {
+  for (const Vocabulary::Found& text : found) {
+    AddWay(ways, field, how, text.worth, {text.term, false});
   }
 }
 
@@ -113,13 +109,18 @@ void AddNearWords(Reading& reading, const std::vector<Field>& fields, Analyzer& 
   ForEachWord(reading, fields, analyzer, [&](Clause& clause, std::size_t i, const Word& word) {
     const Typed typed(word.plain);
     const Field& field = fields[i];
-    AddWays(clause.ways, field, How::kTypo, kWithTypo * WorthOf(field.role, How::kWord), false,
-            vocabulary.FindWords(i, typed.Near()));
-    if (&clause != &reading.back()) return;
-    AddWays(clause.ways, field, How::kTypo, kWithTypo * WorthOf(field.role, How::kBeginning), false,
-            vocabulary.FindWords(i, typed.NearlyBegun()));
-    AddWays(clause.ways, field, How::kTypo, kUnfinishedWorth, false,
-            StemsWithEndings(field, analyzer, word.raw));
+    const bool last = &clause == &reading.back();
+    const auto worth = [&](const std::u32string& text) {
+      if (typed.IsNearly(text)) return kWithTypo * WorthOf(field.role, How::kWord);
+      if (!last || !typed.NearlyBegins(text)) return 0.0;
+      return kWithTypo * WorthOf(field.role, How::kBeginning);
+    };
+    AddWays(clause.ways, field, How::kTypo,
+            vocabulary.FindWords(i, {typed.GetLetters(), true, worth}));
+    if (!last) return;
+    for (const std::string& stem : StemsWithEndings(field, analyzer, word.raw)) {
+      AddWay(clause.ways, field, How::kTypo, kUnfinishedWorth, {stem, false});
+    }
   });
 }
 
@@ -127,14 +128,15 @@ void AddNearWords(Reading& reading, const std::vector<Field>& fields, Analyzer& 
 // or hold it when spaces do not count.
 void AddNearTitles(std::vector<Way>& ways, const Field& field, const Typed& typed,
                    const Vocabulary& vocabulary) {
-  const auto add = [&](double worth, const Vocabulary::Wanted& wanted) {
-    AddWays(ways, field, How::kTypo, worth, false, vocabulary.FindTitles(wanted));
+  const auto worth = [&](const std::u32string& text) {
+    if (!typed.MayBeIn(text)) return 0.0;
+    if (typed.Begins(text)) return WorthOf(field.role, How::kBeginning);
+    if (typed.IsNearly(text)) return kWithTypo * WorthOf(field.role, How::kWholeText);
+    if (typed.NearlyBegins(text)) return kWithTypo * WorthOf(field.role, How::kBeginning);
+    if (!typed.IsIn(text) && !typed.IsNearlyIn(text)) return 0.0;
+    return kWithTypo * WorthOf(field.role, How::kInside);
   };
-  add(kWithTypo * WorthOf(field.role, How::kWholeText), typed.Near());
-  add(WorthOf(field.role, How::kBeginning), typed.Begun());
-  add(kWithTypo * WorthOf(field.role, How::kBeginning), typed.NearlyBegun());
-  add(kWithTypo * WorthOf(field.role, How::kInside), typed.Holding());
-  add(kWithTypo * WorthOf(field.role, How::kInside), typed.NearlyHolding());
+  AddWays(ways, field, How::kTypo, vocabulary.FindTitles({typed.GetLetters(), true, worth}));
 }
 
 }  // namespace
@@ -147,12 +149,12 @@ bool AddMarkless(Plan& plan, const std::vector<Field>& fields, Analyzer& analyze
       if (word.bare == word.plain && space != Space::kBareWords) continue;
       if (field.absent.count(space) != 0) continue;
       const std::string prefix = FieldPrefix(field.member, space);
-      AddWays(clause.ways, field, How::kWord, kWithoutMarks * WorthOf(field.role, How::kWord),
-              false, {WordTerm(prefix, word.bare)});
+      AddWay(clause.ways, field, How::kWord, kWithoutMarks * WorthOf(field.role, How::kWord),
+             {WordTerm(prefix, word.bare), false});
       if (&clause != &plan.parts.back()) continue;
-      AddWays(clause.ways, field, How::kBeginning,
-              kWithoutMarks * WorthOf(field.role, How::kBeginning), true,
-              {WordTermBeginning(prefix, word.bare)});
+      AddWay(clause.ways, field, How::kBeginning,
+             kWithoutMarks * WorthOf(field.role, How::kBeginning),
+             {WordTermBeginning(prefix, word.bare), true});
     }
   });
   const Word whole = analyzer.WholeText(plan.text);
@@ -160,12 +162,12 @@ bool AddMarkless(Plan& plan, const std::vector<Field>& fields, Analyzer& analyze
     if (whole.bare.empty()) break;
     if (field.role != Role::kTitle || field.absent.count(Space::kBareWords) != 0) continue;
     for (const char* prefix : {kTitlePrefix, kPlainTitlePrefix, kBareTitlePrefix}) {
-      AddWays(plan.whole, field, How::kWholeText,
-              kWithoutMarks * WorthOf(field.role, How::kWholeText), false,
-              {WordTerm(prefix, whole.bare)});
-      AddWays(plan.whole, field, How::kWholeBeginning,
-              kWithoutMarks * WorthOf(field.role, How::kWholeBeginning), true,
-              {WordTermBeginning(prefix, whole.bare)});
+      AddWay(plan.whole, field, How::kWholeText,
+             kWithoutMarks * WorthOf(field.role, How::kWholeText),
+             {WordTerm(prefix, whole.bare), false});
+      AddWay(plan.whole, field, How::kWholeBeginning,
+             kWithoutMarks * WorthOf(field.role, How::kWholeBeginning),
+             {WordTermBeginning(prefix, whole.bare), true});
     }
   }
   return CountWays(plan) > before;
@@ -176,8 +178,11 @@ bool AddContaining(Plan& plan, const std::vector<Field>& fields, Analyzer& analy
   const std::size_t before = CountWays(plan);
   ForEachWord(plan.parts, fields, analyzer, [&](Clause& clause, std::size_t i, const Word& word) {
     const Typed typed(word.plain);
-    AddWays(clause.ways, fields[i], How::kInside, WorthOf(fields[i].role, How::kInside), false,
-            vocabulary.FindWords(i, typed.Holding()));
+    const auto worth = [&](const std::u32string& text) {
+      return typed.IsIn(text) ? WorthOf(fields[i].role, How::kInside) : 0;
+    };
+    AddWays(clause.ways, fields[i], How::kInside,
+            vocabulary.FindWords(i, {typed.GetLetters(), false, worth}));
   });
   return CountWays(plan) > before;
 }

@@ -9,6 +9,11 @@
 
 namespace searchd {
 
+void Worths::Begin(std::size_t documents) {
+  Clear();
+  worths_.resize(documents);
+}
+
 double& Worths::At(Xapian::docid document) {
   double& worth = worths_[document];
   if (worth == 0) documents_.push_back(document);
@@ -27,50 +32,52 @@ void Worths::Clear() {
   documents_.clear();
 }
 
-Matcher::Matcher(const Xapian::Database& database)
-    : postings_(database),
-      plan_(database.get_lastdocid() + 1),
-      reading_(database.get_lastdocid() + 1),
-      clause_(database.get_lastdocid() + 1),
-      met_(database.get_lastdocid() + 1) {}
+Matcher::Matcher(const Xapian::Database& database, MatcherNotes& notes)
+    : postings_(database), notes_(notes) {
+  const std::size_t documents = std::size_t{database.get_lastdocid()} + 1;
+  for (Worths* worths : {&notes.plan, &notes.reading, &notes.clause}) worths->Begin(documents);
+  notes.met.assign(documents, 0);
+}
 
 std::vector<Hit> Matcher::Find(const Plan& plan) {
-  RaiseByWays(plan_, plan.whole, IsAny);
+  RaiseByWays(notes_.plan, plan.whole, IsAny);
   for (const View& view : ViewsOf(plan)) RaiseByView(view);
   return TakeHits();
 }
 
 std::vector<Hit> Matcher::TakeHits() {
+  Worths& worths = notes_.plan;
   for (const Posting& application : postings_.Read({kApplicationTerm})) {
-    if (plan_.Of(application.document) > 0) plan_.Add(application.document, kApplicationWorth);
+    if (worths.Of(application.document) > 0) worths.Add(application.document, kApplicationWorth);
   }
   std::vector<Hit> hits;
-  hits.reserve(plan_.Documents().size());
-  for (const Xapian::docid document : plan_.Documents()) {
-    hits.push_back({document, plan_.Of(document)});
+  hits.reserve(worths.Documents().size());
+  for (const Xapian::docid document : worths.Documents()) {
+    hits.push_back({document, worths.Of(document)});
   }
-  plan_.Clear();
+  worths.Clear();
   return hits;
 }
 
 // Raises the worth of documents in which required clauses are all met and any clause is.
 void Matcher::RaiseByView(const View& view) {
+  auto& [plan, reading, clause_worths, met] = notes_;
+  for (const Xapian::docid document : reading.Documents()) met[document] = 0;
+  reading.Clear();
   std::uint32_t required = 0;
-  reading_.Clear();
-  std::fill(met_.begin(), met_.end(), 0);
   for (const Clause& clause : *view.reading) {
-    clause_.Clear();
-    RaiseByWays(clause_, clause.ways, view.counts);
-    if (!clause.optional && clause_.Documents().empty()) return;
+    clause_worths.Clear();
+    RaiseByWays(clause_worths, clause.ways, view.counts);
+    if (!clause.optional && clause_worths.Documents().empty()) return;
     if (!clause.optional) ++required;
-    for (const Xapian::docid document : clause_.Documents()) {
-      reading_.Add(document, clause_.Of(document));
-      if (!clause.optional) ++met_[document];
+    for (const Xapian::docid document : clause_worths.Documents()) {
+      reading.Add(document, clause_worths.Of(document));
+      if (!clause.optional) ++met[document];
     }
   }
   const double factor = view.factor / static_cast<double>(view.reading->size());
-  for (const Xapian::docid document : reading_.Documents()) {
-    if (met_[document] == required) plan_.Raise(document, factor * reading_.Of(document));
+  for (const Xapian::docid document : reading.Documents()) {
+    if (met[document] == required) plan.Raise(document, factor * reading.Of(document));
   }
 }
 

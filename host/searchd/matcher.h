@@ -19,8 +19,7 @@ struct Hit {
 // What documents are worth: a number for each, most of them 0.
 class Worths {
  public:
-  explicit Worths(std::size_t documents) : worths_(documents) {}
-
+  void Begin(std::size_t documents);  // all worth 0, and their numbers below `documents`
   void Raise(Xapian::docid document, double worth);  // unless it is as high already
   void Add(Xapian::docid document, double worth);
   void Clear();
@@ -35,12 +34,22 @@ class Worths {
   std::vector<Xapian::docid> documents_;
 };
 
+// What a Matcher notes down by document. To keep it from one search to the next spares each the
+// time to make room for all documents of an index.
+struct MatcherNotes {
+  Worths plan;
+  Worths reading;
+  Worths clause;
+  std::vector<std::uint32_t> met;  // how many of the reading's required clauses
+};
+
 // Goes through the plan term by term and keeps what documents are worth so far: the ways to find a
 // text are many, the documents that hold it few. What is read from the database stays with the
 // object, for a plan that goes on where one has found nothing. Throws what Xapian throws.
 class Matcher {
  public:
-  explicit Matcher(const Xapian::Database& database);
+  // One Matcher at a time has the notes.
+  Matcher(const Xapian::Database& database, MatcherNotes& notes);
 
   // All documents that the plan finds, in no order.
   std::vector<Hit> Find(const Plan& plan);
@@ -53,10 +62,7 @@ class Matcher {
   std::vector<Hit> TakeHits();
 
   PostingReader postings_;
-  Worths plan_;
-  Worths reading_;
-  Worths clause_;
-  std::vector<std::uint32_t> met_;  // by document: how many of a reading's required clauses
+  MatcherNotes& notes_;
 };
 
 // Up to `count` of the hits: the best first, and where they are worth the same, in the order that

@@ -48,7 +48,7 @@ std::string HitTexts(const Xapian::Database& database, const std::vector<Hit>& h
     const Xapian::Document document = database.get_document(hit.document);
     if (texts.size() > 1) texts += ',';
     texts += HitText(document, hit.worth);
-    if (explain) texts += ",\"explain\":" + JsonText(AssessDocument(plan, document).reasons);
+    if (explain) texts += ",\"explain\":" + JsonText(AssessDocument(plan, document).Reasons());
     texts += '}';
   }
   return texts + ']';
@@ -106,7 +106,7 @@ SearchResult Searcher::Search(const Xapian::Database& database, const SearchRequ
 
 // The hits by the first step that finds any. The plan is then that of this step.
 std::vector<Hit> Searcher::FindByAnyStep(const Xapian::Database& database, Plan& plan) {
-  Matcher matcher(database);
+  Matcher matcher(database, notes_);
   std::vector<Hit> hits = matcher.Find(plan);
   if (!hits.empty() || plan.IsEmpty()) return hits;
   if (MarkUnfinishedCommonWord(plan, analyzer_)) hits = matcher.Find(plan);

@@ -47,6 +47,7 @@ class Searcher {
   Analyzer analyzer_;
   std::vector<Field> fields_;
   bool knows_fields_ = false;
+  MatcherNotes notes_;
   std::unique_ptr<Vocabulary> vocabulary_;  // read when first needed
 };
 

@@ -75,11 +75,12 @@ Vocabulary::Vocabulary(const Xapian::Database& database, const std::vector<Field
   }
 }
 
-std::vector<std::string> Vocabulary::FindWords(std::size_t field, const Wanted& wanted) const {
+std::vector<Vocabulary::Found> Vocabulary::FindWords(std::size_t field,
+                                                     const Wanted& wanted) const {
   return words_[field].Find(wanted);
 }
 
-std::vector<std::string> Vocabulary::FindTitles(const Wanted& wanted) const {
+std::vector<Vocabulary::Found> Vocabulary::FindTitles(const Wanted& wanted) const {
   return titles_.Find(wanted);
 }
 
@@ -122,13 +123,19 @@ void Vocabulary::Shelf::Add(const std::string& term, const std::string& prefix) 
   summaries_.push_back(Summary(letters_.back()));
 }
 
-std::vector<std::string> Vocabulary::Shelf::Find(const Wanted& wanted) const {
-  const std::uint64_t needed = Summary(wanted.some_of);
-  std::vector<std::string> found;
-  for (std::size_t i = 0; i < terms_.size() && found.size() < kMaxFound; ++i) {
+std::vector<Vocabulary::Found> Vocabulary::Shelf::Find(const Wanted& wanted) const {
+  const std::uint64_t needed = Summary(wanted.letters);
+  std::vector<Found> found;
+  for (std::size_t i = 0; i < terms_.size(); ++i) {
     const std::uint64_t lacking = needed & ~summaries_[i];
-    const bool lacks_too_many = wanted.may_lack_one ? HasSeveralBits(lacking) : lacking != 0;
-    if (!lacks_too_many && wanted.accept(letters_[i])) found.push_back(terms_[i]);
+    if (wanted.but_for_one_edit ? HasSeveralBits(lacking) : lacking != 0) continue;
+    const double worth = wanted.worth(letters_[i]);
+    if (worth > 0) found.push_back({terms_[i], worth});
+  }
+  if (found.size() > kMaxFound) {
+    std::stable_sort(found.begin(), found.end(),
+                     [](const Found& a, const Found& b) { return a.worth > b.worth; });
+    found.resize(kMaxFound);
   }
   return found;
 }

@@ -31,20 +31,25 @@ class Vocabulary {
   // the better way.
   bool Learn(const std::set<std::string>& terms);
 
-  // What is looked for. Texts that lack one of the letters `some_of`, or two where one may be
-  // lacking, are passed over; of the others `accept` says whether they are wanted.
+  // What is looked for: texts that hold these letters in a row, as they are or but for one edit.
+  // Most others are passed over; of those that are left `worth` says what they are worth, 0 for
+  // nothing.
   struct Wanted {
-    const std::u32string& some_of;
-    bool may_lack_one;
-    std::function<bool(const std::u32string& letters)> accept;
+    const std::u32string& letters;
+    bool but_for_one_edit;
+    std::function<double(const std::u32string& text)> worth;
+  };
+  struct Found {
+    std::string term;
+    double worth;
   };
 
-  // The terms of the wanted words of field `field`, by its place among the fields; not more than
-  // are looked for at once.
-  std::vector<std::string> FindWords(std::size_t field, const Wanted& wanted) const;
+  // The terms of the wanted words of field `field`, by its place among the fields; where there are
+  // more than are looked for at once, those that are worth most.
+  std::vector<Found> FindWords(std::size_t field, const Wanted& wanted) const;
 
-  // The terms of wanted titles, which have neither accents nor spaces.
-  std::vector<std::string> FindTitles(const Wanted& wanted) const;
+  // The same for titles, which have neither accents nor spaces.
+  std::vector<Found> FindTitles(const Wanted& wanted) const;
 
  private:
   class Shelf {
@@ -53,7 +58,7 @@ class Vocabulary {
     void Read(const Xapian::Database& database, const std::string& prefix);
     // Adds those of the terms that begin with a prefix that was read and are not known yet.
     void Learn(const std::set<std::string>& terms);
-    std::vector<std::string> Find(const Wanted& wanted) const;
+    std::vector<Found> Find(const Wanted& wanted) const;
     std::size_t Size() const { return terms_.size(); }
 
    private:

@@ -67,8 +67,15 @@ TEST(EditDistanceTest, IsWhatTheTableSaysForAllShortWords) {
           << ToText(a) << " typed " << ToText(b);
       EXPECT_EQ(ContainsWithinOneEdit(a, b), SomePartIsNear(a, b))
           << ToText(a) << " typed " << ToText(b);
+      EXPECT_TRUE(MayContainWithinOneEdit(a, b) ||
+                  (Distance(a, b) > 1 && !SomeBeginningIsNear(a, b) && !SomePartIsNear(a, b)))
+          << ToText(a) << " typed " << ToText(b);
     }
   }
+}
+
+TEST(EditDistanceTest, WhatHoldsNeitherHalfMayNotContainIt) {
+  EXPECT_FALSE(MayContainWithinOneEdit(U"mailserver", U"camera"));
 }
 
 TEST(EditDistanceTest, OneSlipAnywhereIsNear) {

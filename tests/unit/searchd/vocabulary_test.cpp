@@ -18,8 +18,14 @@ class VocabularyTest : public testing::Test {
  protected:
   static Vocabulary::Wanted Beginning(const std::u32string& letters) {
     return {letters, false, [&letters](const std::u32string& text) {
-              return text.compare(0, letters.size(), letters) == 0;
+              return text.compare(0, letters.size(), letters) == 0 ? 1.0 : 0.0;
             }};
+  }
+
+  static Strings Terms(const std::vector<Vocabulary::Found>& found) {
+    Strings terms;
+    for (const Vocabulary::Found& text : found) terms.push_back(text.term);
+    return terms;
   }
 
   static std::set<std::string> TermsOf(const std::string& title) {
@@ -41,7 +47,7 @@ class VocabularyTest : public testing::Test {
   Strings Words(const Vocabulary& vocabulary, const std::u32string& beginning) const {
     Strings words;
     const std::string prefix = FieldPrefix("title", Space::kWords);
-    for (const std::string& term : vocabulary.FindWords(Titles(), Beginning(beginning))) {
+    for (const std::string& term : Terms(vocabulary.FindWords(Titles(), Beginning(beginning)))) {
       EXPECT_EQ(term.compare(0, prefix.size(), prefix), 0);
       words.push_back(term.substr(prefix.size()));
     }
@@ -56,7 +62,7 @@ TEST_F(VocabularyTest, HoldsWordsAndTitlesOfTheDatabase) {
   index_.Add("a", "Photo Station");
   const Vocabulary vocabulary(index_.Database(), fields_);
   EXPECT_THAT(Words(vocabulary, U"ph"), ElementsAre("photo"));
-  EXPECT_THAT(vocabulary.FindTitles(Beginning(U"photos")), ElementsAre("~photostation"));
+  EXPECT_THAT(Terms(vocabulary.FindTitles(Beginning(U"photos"))), ElementsAre("~photostation"));
 }
 
 TEST_F(VocabularyTest, LearnsWhatIsNew) {
@@ -66,7 +72,7 @@ TEST_F(VocabularyTest, LearnsWhatIsNew) {
   Vocabulary vocabulary(index_.Database(), fields_);
   ASSERT_TRUE(vocabulary.Learn(TermsOf("Phone Book")));
   EXPECT_THAT(Words(vocabulary, U"pho"), ElementsAre("photo", "phone"));
-  EXPECT_THAT(vocabulary.FindTitles(Beginning(U"phone")), ElementsAre("~phonebook"));
+  EXPECT_THAT(Terms(vocabulary.FindTitles(Beginning(U"phone"))), ElementsAre("~phonebook"));
 }
 
 TEST_F(VocabularyTest, LearnsNothingTwice) {
@@ -96,6 +102,18 @@ TEST_F(VocabularyTest, KnowsWordsAndTitlesAmongAllTerms) {
   EXPECT_FALSE(IsWordOrTitle(KeyTerm("w")));
   EXPECT_FALSE(IsWordOrTitle(kApplicationTerm));
   EXPECT_FALSE(IsWordOrTitle(std::string(1, '\x80')));
+}
+
+TEST_F(VocabularyTest, OfTooManyThoseThatAreWorthMostAreFound) {
+  for (int i = 0; i < 250; ++i) index_.Add("w" + std::to_string(i), "aa" + std::to_string(i));
+  index_.Add("best", "zz");
+  const Vocabulary vocabulary(index_.Database(), fields_);
+  const std::u32string none;
+  const std::vector<Vocabulary::Found> found = vocabulary.FindTitles(
+      {none, false, [](const std::u32string& text) { return text == U"zz" ? 2.0 : 1.0; }});
+  ASSERT_EQ(found.size(), 200U);
+  EXPECT_EQ(found.front().term, "~zz");
+  EXPECT_EQ(found.front().worth, 2);
 }
 
 // While the index is searched and written in turn.
