@@ -23,8 +23,8 @@ using velkor::appindex::kQueuePath;
 constexpr mode_t kQueueMode = 0644;
 
 [[noreturn]] void Fail(const std::string& what, int error) {
-  throw Failure(std::string(kQueuePath) + ": " + what + ": " + std::strerror(error) +
-                (error == EACCES || error == EPERM ? "; run appindex as root" : ""));
+  throw Failure(std::string(kQueuePath) + ": " + what + ": " + std::strerror(error),
+                error == ENOENT ? "make its directory" : AdviceOn(error));
 }
 
 UniqueFd Open() {
@@ -42,13 +42,15 @@ void Lock(int fd) {
 bool IsStillTheQueue(int fd) {
   struct stat locked {};
   struct stat named {};
-  return fstat(fd, &locked) == 0 && lstat(kQueuePath, &named) == 0 &&
-         locked.st_dev == named.st_dev && locked.st_ino == named.st_ino;
+  const bool known = fstat(fd, &locked) == 0 && lstat(kQueuePath, &named) == 0;
+  if (!known && errno != ENOENT) Fail("the queue cannot be looked at", errno);
+  return known && locked.st_dev == named.st_dev && locked.st_ino == named.st_ino;
 }
 
+// An end that cannot be read may be one too: a line feed too many does no harm.
 bool EndsInTornLine(int fd, off_t size) {
   char last = '\n';
-  return size > 0 && pread(fd, &last, 1, size - 1) == 1 && last != '\n';
+  return size > 0 && (pread(fd, &last, 1, size - 1) != 1 || last != '\n');
 }
 
 void SyncDirectory() {

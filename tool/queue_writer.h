@@ -17,7 +17,8 @@ Json::Value QueueRequest(int op, const std::string& path);
 // one taken. What a writer that crashed left unfinished at the end is ended first.
 //
 // Throws Failure when the queue cannot be opened, locked or written, and leaves no part of a line
-// then.
+// then. When all was written but the queue's directory cannot be synced, the lines stay and it
+// throws too: they are there, but may not outlast a power cut.
 void AppendToQueue(const std::vector<Json::Value>& requests);
 
 }  // namespace tool

@@ -116,7 +116,7 @@ class Identity {
     RegainRoot();
     const bool restored =
         (CurrentGroups() == groups_ || setgroups(groups_.size(), groups_.data()) == 0) &&
-        setegid(gid_) == 0 && seteuid(uid_) == 0;
+        (getegid() == gid_ || setegid(gid_) == 0) && (geteuid() == uid_ || seteuid(uid_) == 0);
     if (!restored) std::abort();
   }
 

@@ -17,6 +17,15 @@ bool Overlap(const std::string& a, const std::string& b) {
   return (longer + "/").compare(0, shorter.size() + 1, shorter + "/") == 0;
 }
 
+// Where it fails, the check of the index finds it damaged.
+void TryToFinishEmptying(const std::string& path) {
+  try {
+    FinishEmptying(path);
+  } catch (const RequestError& e) {
+    syslog(LOG_ERR, "storage failure: %s", e.what());
+  }
+}
+
 }  // namespace
 
 Catalog::Catalog(const std::string& registry_file, CheckProcess& checks)
@@ -24,6 +33,7 @@ Catalog::Catalog(const std::string& registry_file, CheckProcess& checks)
   for (IndexDefinition& definition : registry_.Load(registry_damage_)) {
     const std::string id = definition.id;
     const std::string entry = RegistryEntry(definition);
+    TryToFinishEmptying(definition.path);
     auto index = std::make_shared<Index>(std::move(definition), checks_,
                                          DatabaseCheck::Files::kFound, crowded_indexes_);
     indexes_.emplace(id, Known{std::move(index), entry});

@@ -42,10 +42,16 @@ bool WriteSynced(const std::string& file, const std::string& content) {
   return fd.IsOpen() && WriteAll(fd.Get(), content) && fsync(fd.Get()) == 0;
 }
 
+bool SyncDirectory(const std::string& path) {
+  const UniqueFd dir(open(path.c_str(), O_RDONLY | O_DIRECTORY | O_CLOEXEC));
+  return dir.IsOpen() && fsync(dir.Get()) == 0;
+}
+
 void MakeDirectory(const std::string& dir, mode_t mode) {
   if (mkdir(dir.c_str(), mode) == 0) {
-    // The process masks bits out of the mode of what it makes.
-    if (chmod(dir.c_str(), mode) == 0) return;
+    // The process masks bits out of the mode of what it makes. The file in it that is durable would
+    // be lost with an entry that is not.
+    if (chmod(dir.c_str(), mode) == 0 && SyncDirectory(DirectoryOf(dir))) return;
   } else if (errno == EEXIST) {
     return;
   }
@@ -62,8 +68,7 @@ void ReplaceFile(const std::string& file, const std::string& content) {
     errno = error;
     Fail(file);
   }
-  const UniqueFd dir(open(DirectoryOf(file).c_str(), O_RDONLY | O_DIRECTORY | O_CLOEXEC));
-  if (!dir.IsOpen() || fsync(dir.Get()) != 0) Fail(file);
+  if (!SyncDirectory(DirectoryOf(file))) Fail(file);
 }
 
 void MakeDirectories(const std::string& path, unsigned mode) {

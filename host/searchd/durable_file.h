@@ -9,8 +9,8 @@ namespace searchd {
 // holds what it held before. One caller at a time.
 void ReplaceFile(const std::string& file, const std::string& content);
 
-// Makes a directory with missing parents; those are for all to enter, the last one has `mode`.
-// Directories that exist stay as they are. Throws std::runtime_error.
+// Makes a directory with missing parents, durably; those are for all to enter, the last one has
+// `mode`. Directories that exist stay as they are. Throws std::runtime_error.
 void MakeDirectories(const std::string& path, unsigned mode);
 
 }  // namespace searchd

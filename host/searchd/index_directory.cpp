@@ -25,6 +25,8 @@ constexpr std::size_t kMaxPathBytes = 1024;
 constexpr std::size_t kMaxComponentBytes = 255;
 
 constexpr const char* kMarker = "tovoelasticd.index";
+// As long as it is there, the files beside it are of an index that was deleted, or half of them.
+constexpr const char* kEmptied = "tovoelasticd.emptied";
 constexpr std::array<const char*, 6> kTables = {"docdata.glass",  "postlist.glass",
                                                 "position.glass", "spelling.glass",
                                                 "synonym.glass",  "termlist.glass"};
@@ -78,10 +80,11 @@ int OpenDirectory(std::string_view path, bool make) {
 
 std::vector<std::string> Entries(int dir, const std::string& path) {
   // A stream of its own, because closing it closes the descriptor.
-  const int copy = openat(dir, ".", O_RDONLY | O_DIRECTORY | O_CLOEXEC);
-  if (copy < 0) Fail(path);
-  const std::unique_ptr<DIR, int (*)(DIR*)> stream(fdopendir(copy), closedir);
+  UniqueFd copy(openat(dir, ".", O_RDONLY | O_DIRECTORY | O_CLOEXEC));
+  if (!copy.IsOpen()) Fail(path);
+  const std::unique_ptr<DIR, int (*)(DIR*)> stream(fdopendir(copy.Get()), closedir);
   if (!stream) Fail(path);
+  static_cast<void>(copy.Release());  // the stream's from now on
   std::vector<std::string> names;
   while (const dirent* entry = readdir(stream.get())) {
     const std::string name = entry->d_name;
@@ -96,30 +99,39 @@ bool Contains(const Names& names, const std::string& name) {
 }
 
 bool IsIndexFile(const std::string& name) {
-  return name == kMarker || Contains(kTables, name) || Contains(kOtherFiles, name);
+  return name == kMarker || name == kEmptied || Contains(kTables, name) ||
+         Contains(kOtherFiles, name);
+}
+
+void RemoveFile(int dir, const std::string& path, const char* name) {
+  if (unlinkat(dir, name, 0) == 0 || errno == ENOENT) return;
+  // Somebody has put a directory in its place; it goes if it is empty.
+  if (errno != EISDIR || unlinkat(dir, name, AT_REMOVEDIR) != 0) Fail(path + "/" + name);
+}
+
+void MakeFile(int dir, const std::string& path, const char* name, int how) {
+  const UniqueFd file(
+      openat(dir, name, O_WRONLY | O_CREAT | O_NOFOLLOW | O_CLOEXEC | how, S_IRUSR | S_IWUSR));
+  if (!file.IsOpen()) Fail(path + "/" + name);
 }
 
 // The marker goes last: as long as a file of the index is there, the directory is known as ours.
 void RemoveIndexFiles(int dir, const std::string& path) {
-  const auto remove = [&](const char* name) {
-    if (unlinkat(dir, name, 0) == 0 || errno == ENOENT) return;
-    // Somebody has put a directory in its place; it goes if it is empty.
-    if (errno != EISDIR || unlinkat(dir, name, AT_REMOVEDIR) != 0) Fail(path + "/" + name);
-  };
-  for (const char* name : kTables) remove(name);
-  for (const char* name : kOtherFiles) remove(name);
-  remove(kMarker);
+  for (const char* name : kTables) RemoveFile(dir, path, name);
+  for (const char* name : kOtherFiles) RemoveFile(dir, path, name);
+  RemoveFile(dir, path, kMarker);
 }
 
 void ClearLeftovers(int dir, const std::string& path, bool known) {
   const std::vector<std::string> names = Entries(dir, path);
   if (names.empty()) return;
-  const bool ours = known || Contains(names, kMarker);
+  const bool ours = known || Contains(names, kMarker) || Contains(names, kEmptied);
   for (const std::string& name : names) {
     if (ours && IsIndexFile(name)) continue;
     throw RequestError(Code::kRejected,
                        "\"path\" holds what is not of an index: " + path + "/" + name);
   }
+  MakeFile(dir, path, kEmptied, 0);
   RemoveIndexFiles(dir, path);
 }
 
@@ -154,9 +166,13 @@ std::string CheckedIndexPath(const std::string& path) {
 void PrepareIndexDirectory(const std::string& path, bool known) {
   const UniqueFd dir(OpenDirectory(path, true));
   ClearLeftovers(dir.Get(), path, known);
-  const UniqueFd marker(
-      openat(dir.Get(), kMarker, O_WRONLY | O_CREAT | O_EXCL | O_CLOEXEC, S_IRUSR | S_IWUSR));
-  if (!marker.IsOpen()) Fail(path + "/" + kMarker);
+  MakeFile(dir.Get(), path, kMarker, O_EXCL);
+  RemoveFile(dir.Get(), path, kEmptied);
+}
+
+void FinishEmptying(const std::string& path) {
+  const UniqueFd dir(OpenDirectory(path, false));
+  if (dir.IsOpen() && IsFile(dir.Get(), kEmptied, 0)) PrepareIndexDirectory(path, true);
 }
 
 void RemoveIndexDirectory(const std::string& path) {
@@ -165,6 +181,7 @@ void RemoveIndexDirectory(const std::string& path) {
   const UniqueFd dir(OpenDirectory(path, false));
   if (!parent.IsOpen() || !dir.IsOpen()) return;
   RemoveIndexFiles(dir.Get(), path);
+  RemoveFile(dir.Get(), path, kEmptied);
   // One that holds something else stays: whoever put it there may want it.
   if (unlinkat(parent.Get(), path.c_str() + slash + 1, AT_REMOVEDIR) != 0 && errno != ENOTEMPTY &&
       errno != EEXIST) {

@@ -18,8 +18,13 @@ std::string CheckedIndexPath(const std::string& path);
 
 // Makes the empty directory of a new index with missing parents, mode 0700. What an earlier index
 // left there is cleared: it is known by its marker, or the caller has `known` the index. Anything
-// else that is found there is rejected.
+// else that is found there is rejected. Until it is done, another file says that what is there is
+// to be cleared.
 void PrepareIndexDirectory(const std::string& path, bool known);
+
+// Does so for an index that is known, where a process has died in the middle of it. Throws
+// RequestError.
+void FinishEmptying(const std::string& path);
 
 // Removes an index's files and its directory. A directory that is gone already is no error.
 void RemoveIndexDirectory(const std::string& path);

@@ -37,6 +37,12 @@ std::vector<IndexDefinition> Parse(const std::string& text) {
   return indexes;
 }
 
+// Whether a file that cannot be read now may be read another time, whatever it holds.
+bool MayPass(int error) {
+  return error == EIO || error == EMFILE || error == ENFILE || error == ENOMEM || error == EINTR ||
+         error == EACCES;
+}
+
 // `name`, with a number added if there is something of that name.
 std::string FreeName(const std::string& name) {
   struct stat status {};
@@ -59,6 +65,7 @@ std::vector<IndexDefinition> Registry::Load(std::string& damage) const {
   damage.clear();
   const std::optional<std::string> text = host::sdk::ReadRegularFile(file_, kMaxBytes);
   if (!text && errno == ENOENT) return {};
+  if (!text && MayPass(errno)) throw RequestError(Code::kStorage, WithErrno(file_, errno));
   try {
     if (!text) throw RequestError(Code::kStorage, WithErrno("it cannot be read", errno));
     return Parse(*text);

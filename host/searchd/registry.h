@@ -18,7 +18,8 @@ class Registry {
   // The registered indexes; none when there is no file. What is there but cannot be read as a
   // registry is moved aside, to the same name with ".damaged" added, or ".damaged.2" and so on if
   // that is taken, and there are none; `damage` then says what was wrong. Throws
-  // RequestError(kStorage) when it cannot be moved.
+  // RequestError(kStorage) when it cannot be moved, and for a file that may hold a registry but
+  // cannot be read now, for want of memory for instance: nothing is forgotten then.
   std::vector<IndexDefinition> Load(std::string& damage) const;
 
   // Replaces the file, durably, by one with these entries: after a crash it holds either them or

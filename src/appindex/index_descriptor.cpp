@@ -8,6 +8,7 @@
 #include "common/check.h"
 #include "common/dir_reader.h"
 #include "common/file_io.h"
+#include "common/searched_dirs.h"
 
 namespace velkor::appindex {
 namespace {
@@ -104,11 +105,16 @@ void Descriptor::Parse(std::string text) {
   if (complete) text_ = std::move(text);
 }
 
-bool FindIndexConfByAppRoot(std::string& conf_path, const std::string& find_dir, unsigned depth) {
+namespace {
+
+bool FindIndexConfIn(std::string& conf_path, const std::string& find_dir, unsigned depth,
+                     SearchedDirs& searched) {
   DirReader dir(find_dir);
   CheckOrThrow(dir.IsOpen(), {kIndexMgr, 100, "FindIndexConfByAppRoot"},
                "nullptr == (dir = opendir(find_dir.c_str()))", Error::kGeneralError,
                [&find_dir] { return "opendir failed, path=" + find_dir; });
+  const int level = static_cast<int>(depth);
+  if (searched.Has(dir, level)) return false;
   std::string name;
   while (dir.Next(name)) {
     const std::string child = find_dir + name;
@@ -117,11 +123,19 @@ bool FindIndexConfByAppRoot(std::string& conf_path, const std::string& find_dir,
       return true;
     }
     if (depth < kMaxSearchDepth && IsDirExist(child, true) &&
-        FindIndexConfByAppRoot(conf_path, child + "/", depth + 1)) {
+        FindIndexConfIn(conf_path, child + "/", depth + 1, searched)) {
       return true;
     }
   }
+  searched.Add(dir, level);
   return false;
+}
+
+}  // namespace
+
+bool FindIndexConfByAppRoot(std::string& conf_path, const std::string& find_dir, unsigned depth) {
+  SearchedDirs searched;
+  return FindIndexConfIn(conf_path, find_dir, depth, searched);
 }
 
 std::set<std::string> FindIndexConf() {

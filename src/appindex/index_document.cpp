@@ -13,6 +13,10 @@ namespace {
 
 constexpr int kMaxWeight = 5;
 
+// Longer than any message to the search daemon. Weights and long texts can make a small descriptor
+// ask for more than there is memory; what is left out could not be sent.
+constexpr std::size_t kMaxKeywordBytes = std::size_t{16} * 1024 * 1024;
+
 struct Keyword {
   std::string ref;
   int weight = 1;
@@ -32,6 +36,7 @@ Keyword ReadKeyword(const Json::Value& element) {
 // The keyword in the user's language and in English; its weight is how often the pair is repeated.
 void AppendKeyword(std::string& text, StringPool& pool, const std::string& lang,
                    const Keyword& keyword) {
+  if (text.size() > kMaxKeywordBytes) return;
   const std::string pair =
       pool.GetString(lang, keyword.ref) + " " + pool.GetString(kEnglish, keyword.ref) + " ";
   for (int i = 0; i < std::min(keyword.weight, kMaxWeight); ++i) text += pair;

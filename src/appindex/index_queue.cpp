@@ -1,5 +1,7 @@
 // The work queue: requests that other programs leave in a file, one JSON object a line.
 #include <cxxabi.h>
+#include <fcntl.h>
+#include <sys/stat.h>
 #include <unistd.h>
 
 #include <algorithm>
@@ -20,9 +22,16 @@
 #include "common/check.h"
 #include "common/file_io.h"
 #include "common/json_strict.h"
+#include "common/unique_fd.h"
 
 namespace velkor::appindex {
 namespace {
+
+// What cannot be looked at may be a batch, which must not be replaced.
+bool IsNoFile(const std::string& path) {
+  struct stat info {};
+  return lstat(path.c_str(), &info) == 0 ? !S_ISREG(info.st_mode) : errno == ENOENT;
+}
 
 // Moves the live queue aside, while no writer is in the middle of a line.
 void TakeQueue() {
@@ -32,30 +41,29 @@ void TakeQueue() {
                [] { return std::string("rename failed, reason=") + std::strerror(errno); });
 }
 
-void ReadRequest(Batch& batch, const std::string& line) {
-  Json::Value request;
-  if (!fromString(request, line)) return;
-  int op = 0;
-  std::string path;
-  GetStrictInt(op, request, "op", true);
-  GetStrictString(path, request, "path", false);
-  batch[path] = op;
-}
-
-// A request that cannot be read is logged and skipped: it must not hold up the others.
+// A request whose members cannot be read is logged and skipped: it must not hold up the others.
+// What else fails here, such as memory, must not make it forgotten: that ends the reading.
 void ReadLine(Batch& batch, const std::string& line) {
   constexpr CheckSite kBadRequest = {kIndexMgr, 350, "ProcessQueue"};
   constexpr CheckSite kFailedRequest = {kIndexMgr, 353, "ProcessQueue"};
   const auto failure = [&line] { return "ProcessQueue failed, cmd: " + line; };
+  Json::Value request;
+  if (!fromString(request, line)) return;
+  int op = 0;
+  std::string path;
   try {
-    ReadRequest(batch, line);
+    GetStrictInt(op, request, "op", true);
+    GetStrictString(path, request, "path", false);
   } catch (const Error& error) {
     LogFailureText(kBadRequest, failure() + ", reason: " + error.what());
+    return;
   } catch (const abi::__forced_unwind&) {
     throw;  // the thread is being cancelled
   } catch (...) {
     LogFailureText(kFailedRequest, failure());
+    return;
   }
+  batch[path] = op;
 }
 
 void Perform(int op, const std::string& path) {
@@ -77,6 +85,15 @@ void PerformAll(const Batch& batch) {
     Tell(&Observer::OnRequest, ++number, batch.size());
     Perform(op, path);
   }
+}
+
+// Whether the batch is still the file that is open. Who removes the process lock's file lets a
+// second processor in, and that one may have finished this batch and begun the next.
+bool IsStillTheBatch(const UniqueFd& batch) {
+  struct stat opened {};
+  struct stat named {};
+  return fstat(batch.Get(), &opened) == 0 && lstat(kBatchPath, &named) == 0 &&
+         opened.st_dev == named.st_dev && opened.st_ino == named.st_ino;
 }
 
 }  // namespace
@@ -102,12 +119,13 @@ void ProcessQueue() {
     if (access(elastic::kElasticdSockPath, F_OK) != 0) return;  // no daemon: for a later call
 
     // A batch that an earlier call left unfinished comes first.
-    if (IsFileExist(kQueuePath) && !IsFileExist(kBatchPath)) TakeQueue();
+    if (IsFileExist(kQueuePath) && IsNoFile(kBatchPath)) TakeQueue();
     if (!IsFileExist(kBatchPath)) return;
+    const UniqueFd batch(open(kBatchPath, O_RDONLY | O_NONBLOCK | O_CLOEXEC));
     PerformAll(ReadBatch(kBatchPath));
 
     // Only now: until here the batch file is the record of what is not done yet.
-    unlink(kBatchPath);
+    if (IsStillTheBatch(batch)) unlink(kBatchPath);
   }
 }
 

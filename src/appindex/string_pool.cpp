@@ -12,6 +12,7 @@
 #include "appindex/utils_internal.h"
 #include "common/check.h"
 #include "common/dir_reader.h"
+#include "common/searched_dirs.h"
 #include "device/tovo_webui.h"
 
 namespace velkor::appindex {
@@ -51,13 +52,13 @@ std::string PackageTextsRoot(const std::string& conf_path) {
   return root;
 }
 
-}  // namespace
-
-bool FindPkgTextRoot(std::string& out, const std::string& find_dir, int depth) {
+bool FindTextRootIn(std::string& out, const std::string& find_dir, int depth,
+                    SearchedDirs& searched) {
   DirReader dir(find_dir);
   CheckOrThrow(dir.IsOpen(), {"string_pool", 42, "FindPkgTextRoot"},
                "nullptr == (dir = opendir(find_dir.c_str()))", Error::kGeneralError,
                [&find_dir] { return "opendir failed, path=" + find_dir; });
+  if (searched.Has(dir, depth)) return false;
   std::string name;
   while (dir.Next(name)) {
     const std::string child = find_dir + name + "/";
@@ -66,9 +67,17 @@ bool FindPkgTextRoot(std::string& out, const std::string& find_dir, int depth) {
       out = child;
       return true;
     }
-    if (depth < kMaxSearchDepth && FindPkgTextRoot(out, child, depth + 1)) return true;
+    if (depth < kMaxSearchDepth && FindTextRootIn(out, child, depth + 1, searched)) return true;
   }
+  searched.Add(dir, depth);
   return false;
+}
+
+}  // namespace
+
+bool FindPkgTextRoot(std::string& out, const std::string& find_dir, int depth) {
+  SearchedDirs searched;
+  return FindTextRootIn(out, find_dir, depth, searched);
 }
 
 LanguagePack::LanguagePack(const std::string& texts_root) {

@@ -3,6 +3,7 @@
 #include <unistd.h>
 
 #include <algorithm>
+#include <memory>
 
 #include "common/check.h"
 #include "device/tovo_config.h"
@@ -33,8 +34,8 @@ SDKCredentials::SDKCredentials() : euid_(geteuid()), egid_(getegid()) {
   CheckOrThrow(result >= 0 && user_info != nullptr, {"credentials", 22, "SDKCredentials"},
                "0 > TOVOUserGetByUID(euid_, &user_info) || !user_info", Error::kCredentialsError,
                LookupFailure);
-  username_ = user_info->name;
-  TOVOUserFree(user_info);
+  const std::unique_ptr<TOVOUSER, void (*)(TOVOUSER*)> record(user_info, TOVOUserFree);
+  username_ = record->name;
 }
 
 SDKCredentials::SDKCredentials(const std::string& name)

@@ -21,6 +21,9 @@ class DirReader {
 
   bool IsOpen() const { return dir_ != nullptr; }
 
+  // The descriptor of the open directory, which stays its owner's.
+  int Fd() const { return dirfd(dir_); }
+
   // Puts the next entry's name into `name`, in the order the file system gives; false at the end
   // and when reading fails. "." and ".." are left out.
   bool Next(std::string& name) {

@@ -2,13 +2,14 @@
 
 #include <fcntl.h>
 #include <stdlib.h>
+#include <sys/file.h>
 #include <sys/stat.h>
 #include <unistd.h>
 
-#include <algorithm>
 #include <cerrno>
 #include <cstdio>
 
+#include "common/dir_reader.h"
 #include "common/unique_fd.h"
 
 namespace velkor {
@@ -17,6 +18,10 @@ namespace {
 bool FailWith(int error) {
   errno = error;
   return false;
+}
+
+bool IsRegular(const struct stat& info) {
+  return S_ISREG(info.st_mode) || FailWith(S_ISDIR(info.st_mode) ? EISDIR : EINVAL);
 }
 
 bool WriteAll(int fd, const std::string& content) {
@@ -32,11 +37,53 @@ bool WriteAll(int fd, const std::string& content) {
   return true;
 }
 
-bool SyncDirectoryOf(const std::string& path) {
+std::string DirectoryOf(const std::string& path) {
   const std::string::size_type slash = path.rfind('/');
-  const std::string dir = slash == std::string::npos ? "." : path.substr(0, slash + 1);
-  const UniqueFd fd(open(dir.c_str(), O_RDONLY | O_DIRECTORY | O_CLOEXEC));
+  return slash == std::string::npos ? "./" : path.substr(0, slash + 1);
+}
+
+bool SyncDirectoryOf(const std::string& path) {
+  const UniqueFd fd(open(DirectoryOf(path).c_str(), O_RDONLY | O_DIRECTORY | O_CLOEXEC));
   return fd.IsOpen() && fsync(fd.Get()) == 0;
+}
+
+// A temporary file's name is that of the file, this, and characters that make it unlike all others.
+constexpr char kTemporaryMark[] = ".new.";
+constexpr char kUniquePart[] = "XXXXXX";
+
+// Who writes a temporary file holds its lock until it is renamed. One that nobody holds was left by
+// a process that died.
+void RemoveTemporary(const std::string& temporary) {
+  const UniqueFd fd(open(temporary.c_str(), O_RDONLY | O_NOFOLLOW | O_NONBLOCK | O_CLOEXEC));
+  if (fd.IsOpen() && flock(fd.Get(), LOCK_EX | LOCK_NB) == 0) unlink(temporary.c_str());
+}
+
+void RemoveLeftovers(const std::string& path) {
+  const int kept = errno;
+  const std::string dir = DirectoryOf(path);
+  const std::string mark = path.substr(path.rfind('/') + 1) + kTemporaryMark;
+  DirReader reader(dir);
+  std::string name;
+  while (reader.IsOpen() && reader.Next(name)) {
+    const bool ours = name.size() == mark.size() + sizeof(kUniquePart) - 1 &&
+                      name.compare(0, mark.size(), mark) == 0;
+    if (ours) RemoveTemporary(dir + name);
+  }
+  errno = kept;
+}
+
+// Makes a temporary file that nobody takes for a leftover, and tells its name: it is locked, and
+// was still there then. Another writer may have removed it in the moment before. Where there are no
+// locks, nobody can take it for a leftover either. -1 with errno set when that fails.
+int OpenTemporary(const std::string& path, std::string& temporary) {
+  for (;;) {
+    temporary = path + kTemporaryMark + kUniquePart;
+    const int fd = mkostemp(temporary.data(), O_CLOEXEC);
+    if (fd < 0) return -1;
+    struct stat info {};
+    if (flock(fd, LOCK_EX) != 0 || fstat(fd, &info) != 0 || info.st_nlink > 0) return fd;
+    close(fd);
+  }
 }
 
 // The mode comes before the content, so that nobody reads what they may not.
@@ -48,15 +95,18 @@ bool FillFile(UniqueFd& fd, const std::string& content, mode_t mode) {
 }  // namespace
 
 bool ReadRegularFile(const std::string& path, std::size_t limit, std::string& content) {
-  const UniqueFd fd(open(path.c_str(), O_RDONLY | O_NONBLOCK | O_CLOEXEC));
-  if (!fd.IsOpen()) return false;
+  if (path.find('\0') != std::string::npos) return FailWith(ENOENT);  // another name to the system
+  // Looked at before it is opened: that alone makes a watchdog run, winds a tape back, or gives the
+  // process a terminal. Once open, it may be another file.
   struct stat info {};
-  if (fstat(fd.Get(), &info) != 0) return false;
-  if (!S_ISREG(info.st_mode)) return FailWith(S_ISDIR(info.st_mode) ? EISDIR : EINVAL);
+  if (stat(path.c_str(), &info) != 0 || !IsRegular(info)) return false;
+  const UniqueFd fd(open(path.c_str(), O_RDONLY | O_NONBLOCK | O_NOCTTY | O_CLOEXEC));
+  if (!fd.IsOpen() || fstat(fd.Get(), &info) != 0 || !IsRegular(info)) return false;
+  if (static_cast<std::size_t>(info.st_size) > limit) return FailWith(EFBIG);
 
   const int kept = errno;
   // Room for one byte more than the file is said to have: where it has more, the text grows.
-  std::string text(std::min(static_cast<std::size_t>(info.st_size), limit) + 1, '\0');
+  std::string text(static_cast<std::size_t>(info.st_size) + 1, '\0');
   std::size_t done = 0;
   for (;;) {
     const ssize_t n = read(fd.Get(), &text[done], text.size() - done);
@@ -76,9 +126,11 @@ bool ReadRegularFile(const std::string& path, std::size_t limit, std::string& co
 }
 
 bool ReplaceFile(const std::string& path, const std::string& content, mode_t mode) {
-  std::string temporary = path + ".XXXXXX";
-  UniqueFd fd(mkostemp(temporary.data(), O_CLOEXEC));
+  RemoveLeftovers(path);
+  std::string temporary;
+  UniqueFd fd(OpenTemporary(path, temporary));
   if (!fd.IsOpen()) return false;
+  const UniqueFd lock(fcntl(fd.Get(), F_DUPFD_CLOEXEC, 0));
   if (!FillFile(fd, content, mode) || rename(temporary.c_str(), path.c_str()) != 0) {
     const int failed_with = errno;
     unlink(temporary.c_str());

@@ -18,7 +18,8 @@ bool ReadRegularFile(const std::string& path, std::size_t limit, std::string& co
 // Replaces the file at `path` with `content`, with the permission bits `mode` from its first
 // moment: written to a temporary file beside it, synced, renamed over it, and the directory synced.
 // Returns false, with errno set and nothing left behind, when any step fails; the old file is then
-// still in place, unless only the directory's sync failed.
+// still in place, unless only the directory's sync failed. A process that dies meanwhile leaves the
+// temporary file, "PATH.new." and six characters, which the next call removes.
 bool ReplaceFile(const std::string& path, const std::string& content, mode_t mode);
 
 }  // namespace velkor

@@ -8,6 +8,7 @@
 #include <array>
 #include <cctype>
 #include <cerrno>
+#include <memory>
 
 #include "appindex/error.h"
 #include "appindex/utilities/credentials.h"
@@ -40,14 +41,13 @@ struct Owner {
 
 Owner LookUpPackageUser() {
   const LockMutex lock(sdk::SDKMutex());
-  TOVOUSER* record = nullptr;
-  if (TOVOUserGet(kPackageUser, &record) < 0 || record == nullptr) throw Error(Error::kChownError);
-  const Owner owner{record->uid, record->gid};
+  TOVOUSER* found = nullptr;
+  if (TOVOUserGet(kPackageUser, &found) < 0 || found == nullptr) throw Error(Error::kChownError);
+  const std::unique_ptr<TOVOUSER, void (*)(TOVOUSER*)> record(found, TOVOUserFree);
   // The device's user query asks for the home service with every user that it looks up; nothing
   // here depends on the answer.
   TOVOServiceUserHomeIsEnabled(kPackageUser);
-  TOVOUserFree(record);
-  return owner;
+  return {record->uid, record->gid};
 }
 
 }  // namespace

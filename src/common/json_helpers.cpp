@@ -97,9 +97,11 @@ void GetJsonValue(T& out, const Json::Value& obj, const std::string& key, bool r
   ReadMember(out, obj, key, required, IsReadable<T>);
 }
 
+// Marked once more: what is made of a type that is not marked itself, as those of the JSON library,
+// would stay hidden in spite of the template's mark.
 template <>
-void GetJsonValue<Json::Value>(Json::Value& out, const Json::Value& obj, const std::string& key,
-                               bool required) {
+TEISEIGATRO_EXPORT void GetJsonValue<Json::Value>(Json::Value& out, const Json::Value& obj,
+                                                  const std::string& key, bool required) {
   const Json::Value* member = FindMember(obj, key, required);
   if (member == nullptr) return;
   Json::Value copy(*member);  // `out` may be `obj` itself

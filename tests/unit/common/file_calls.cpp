@@ -62,6 +62,11 @@ int close(int fd) {
   return -1;
 }
 
+ssize_t read(int fd, void* data, size_t size) {
+  static auto* const real = test::Real<ssize_t(int, void*, size_t)>("read");
+  return test::Fails("read", fd) ? -1 : real(fd, data, size);
+}
+
 ssize_t write(int fd, const void* data, size_t size) {
   static auto* const real = test::Real<ssize_t(int, const void*, size_t)>("write");
   return test::Fails("write", fd) ? -1 : real(fd, data, size);

@@ -7,7 +7,7 @@
 
 namespace test {
 
-// One call of open, close, write, fsync, fchmod, rename or flock.
+// One call of open, close, read, write, fsync, fchmod, rename or flock.
 struct FileCall {
   std::string name;
   int fd;            // -1 for open and rename

@@ -2,6 +2,7 @@
 
 #include <dlfcn.h>
 #include <fcntl.h>
+#include <sys/socket.h>
 #include <sys/stat.h>
 #include <unistd.h>
 
@@ -45,6 +46,36 @@ int fsync(int fd) {
 ssize_t write(int fd, const void* data, size_t size) {
   static auto* const real = Real<ssize_t(int, const void*, size_t)>("write");
   return faults.write.Strikes() ? -1 : real(fd, data, size);
+}
+
+ssize_t read(int fd, void* data, size_t size) {
+  static auto* const real = Real<ssize_t(int, void*, size_t)>("read");
+  return faults.read.Strikes() ? -1 : real(fd, data, size);
+}
+
+ssize_t send(int fd, const void* data, size_t size, int flags) {
+  static auto* const real = Real<ssize_t(int, const void*, size_t, int)>("send");
+  return faults.send.Strikes() ? -1 : real(fd, data, size, flags);
+}
+
+ssize_t recv(int fd, void* data, size_t size, int flags) {
+  static auto* const real = Real<ssize_t(int, void*, size_t, int)>("recv");
+  return faults.recv.Strikes() ? -1 : real(fd, data, size, flags);
+}
+
+int socket(int domain, int type, int protocol) noexcept {
+  static auto* const real = Real<int(int, int, int)>("socket");
+  return faults.socket.Strikes() ? -1 : real(domain, type, protocol);
+}
+
+int connect(int fd, const sockaddr* address, socklen_t size) {
+  static auto* const real = Real<int(int, const sockaddr*, socklen_t)>("connect");
+  return faults.connect.Strikes() ? -1 : real(fd, address, size);
+}
+
+int setsockopt(int fd, int level, int name, const void* value, socklen_t size) noexcept {
+  static auto* const real = Real<int(int, int, int, const void*, socklen_t)>("setsockopt");
+  return faults.setsockopt.Strikes() ? -1 : real(fd, level, name, value, size);
 }
 
 int seteuid(uid_t uid) noexcept {

@@ -24,7 +24,13 @@ class Fault {
 struct Faults {
   Fault rename;
   Fault fsync;
+  Fault read;
   Fault write;
+  Fault send;
+  Fault recv;
+  Fault socket;
+  Fault connect;
+  Fault setsockopt;
   Fault seteuid;
   bool statx_knows_mounts = true;  // false: as a kernel that does not tell mount points
 };

@@ -4,15 +4,21 @@
 #include <fcntl.h>
 #include <gmock/gmock.h>
 #include <sys/file.h>
+#include <sys/resource.h>
 #include <sys/stat.h>
 #include <sys/wait.h>
 #include <unistd.h>
 
+#include <csignal>
+#include <cstring>
+#include <string>
 #include <thread>
+#include <vector>
 
 #include "common/unique_fd.h"
 #include "tests/support/device_root_test.h"
 #include "tests/support/indexing.h"
+#include "tests/unit/tool/recorded_calls.h"
 #include "tool/failure.h"
 #include "tool/lock_holders.h"
 
@@ -22,6 +28,12 @@ namespace {
 using test::kBatch;
 using test::kQueue;
 using test::ReadFile;
+using test::RecordedCalls;
+using ::testing::AllOf;
+using ::testing::ElementsAre;
+using ::testing::EndsWith;
+using ::testing::HasSubstr;
+using ::testing::StartsWith;
 
 class QueueWriterTest : public test::DeviceRootTest {
  protected:
@@ -97,20 +109,75 @@ TEST_F(QueueWriterTest, WaitingWriterTakesTheQueueThatIsThereWhenItWakes) {
   EXPECT_EQ(ReadFile(kQueue), kRebuild);
 }
 
-TEST_F(QueueWriterTest, FailuresNameTheFileAndTheCause) {
+TEST_F(QueueWriterTest, FailuresNameTheFileTheCauseAndWhatToDo) {
+  const std::string opening = std::string(kQueue) + ": the queue cannot be opened: ";
   test::MakeDirs(kQueue);
-  EXPECT_EQ(Refusal(), std::string(kQueue) + ": the queue cannot be opened: Is a directory");
+  EXPECT_EQ(Refusal(), opening + "Is a directory; put a regular file in its place");
   ASSERT_EQ(rmdir(kQueue), 0);
   ASSERT_EQ(symlink("/etc/passwd", kQueue), 0);
-  EXPECT_THAT(Refusal(), testing::HasSubstr("the queue cannot be opened: Too many levels"));
-  ASSERT_EQ(unlink(kQueue), 0);
-  ASSERT_EQ(symlink("/dev/full", kQueue), 0);
+  EXPECT_THAT(Refusal(), AllOf(StartsWith(opening + "Too many levels"),
+                               EndsWith("; put a regular file in its place")));
+}
+
+// One write of everything, and then the file and its directory made durable.
+
+TEST_F(QueueWriterTest, EverythingIsOneWriteAndSynced) {
+  test::WriteFile(kQueue, "{\"op\":1,\"pa");
+  std::vector<std::string> calls;
+  {
+    const RecordedCalls recorded(calls);
+    AppendToQueue({QueueRequest(1, "/a"), QueueRequest(3, "")});
+  }
+  const std::string lines = "\n{\"op\":1,\"path\":\"/a\"}\n" + std::string(kRebuild);
+  EXPECT_THAT(calls, ElementsAre("write " + std::to_string(lines.size()) + " to a file",
+                                 "fsync of a file", "fsync of a directory"));
+  EXPECT_EQ(ReadFile(kQueue), "{\"op\":1,\"pa" + lines);
+}
+
+TEST_F(QueueWriterTest, WriteThatTakesAPartIsTakenBack) {
+  test::WriteFile(kQueue, kRebuild);
+  ASSERT_NE(std::signal(SIGXFSZ, SIG_IGN), SIG_ERR);
+  const rlimit limit = {sizeof(kRebuild) + 5, RLIM_INFINITY};  // in the middle of the line
+  ASSERT_EQ(setrlimit(RLIMIT_FSIZE, &limit), 0);
+  const std::string refusal = Refusal();
+  const rlimit none = {RLIM_INFINITY, RLIM_INFINITY};
+  ASSERT_EQ(setrlimit(RLIMIT_FSIZE, &none), 0);
+  EXPECT_EQ(refusal, std::string(kQueue) +
+                         ": the queue cannot be written: No space left on device"
+                         "; make room on its file system");
+  EXPECT_EQ(ReadFile(kQueue), kRebuild);
+}
+
+TEST_F(QueueWriterTest, LineThatCannotBeSyncedIsTakenBack) {
+  test::WriteFile(kQueue, kRebuild);
+  std::vector<std::string> calls;
+  const RecordedCalls recorded(calls, {"fsync of a file"});
+  EXPECT_EQ(Refusal(), std::string(kQueue) +
+                           ": the queue cannot be written: Input/output error; see to the disk");
+  EXPECT_EQ(calls.back(), "ftruncate to " + std::to_string(std::strlen(kRebuild)));
+  EXPECT_EQ(ReadFile(kQueue), kRebuild);
+}
+
+TEST_F(QueueWriterTest, DirectoryThatCannotBeSyncedLeavesTheLineAndIsToldOf) {
+  std::vector<std::string> calls;
+  const RecordedCalls recorded(calls, {"fsync of a directory"});
+  EXPECT_THAT(Refusal(), AllOf(StartsWith(std::string(kQueue) + ": "),
+                               HasSubstr("cannot be synced: Input/output error")));
+  EXPECT_EQ(ReadFile(kQueue), kRebuild);
+}
+
+TEST_F(QueueWriterTest, PartOfALineThatStaysIsToldOf) {
+  test::WriteFile(kQueue, kRebuild);
+  std::vector<std::string> calls;
+  const RecordedCalls recorded(calls, {"fsync of a file", "ftruncate"});
+  EXPECT_THAT(Refusal(), HasSubstr("a part of a line could not be taken back"));
 }
 
 TEST_F(QueueWriterTest, WithoutItsDirectoryItCannotBeMade) {
   ASSERT_EQ(rmdir("/var/packages/Velkor/etc"), 0);
-  EXPECT_EQ(Refusal(),
-            std::string(kQueue) + ": the queue cannot be opened: No such file or directory");
+  EXPECT_EQ(Refusal(), std::string(kQueue) +
+                           ": the queue cannot be opened: No such file or directory; make its "
+                           "directory");
 }
 
 }  // namespace
