@@ -2,6 +2,9 @@
 
 #include <json/reader.h>
 #include <json/writer.h>
+#include <linux/sockios.h>
+#include <sched.h>
+#include <sys/ioctl.h>
 #include <sys/socket.h>
 #include <sys/un.h>
 #include <unistd.h>
@@ -41,6 +44,24 @@ int Listen() {
 
 void SendRaw(int fd, const std::string& bytes) {
   send(fd, bytes.data(), bytes.size(), MSG_NOSIGNAL);
+}
+
+// The peer has taken a byte when none waits in the socket.
+bool IsTaken(int fd) {
+  int waiting = 0;
+  return ioctl(fd, SIOCOUTQ, &waiting) != 0 || waiting == 0;
+}
+
+void SendOneByOne(int fd, const std::string& bytes) {
+  for (const char byte : bytes) {
+    if (send(fd, &byte, 1, MSG_NOSIGNAL) != 1) return;
+    while (!IsTaken(fd)) sched_yield();
+  }
+}
+
+void ReadPart(int fd, std::size_t bytes) {
+  std::string part(bytes, '\0');
+  recv(fd, part.data(), part.size(), MSG_WAITALL);
 }
 
 }  // namespace
@@ -95,6 +116,7 @@ void ScriptedDaemon::Handle(int fd) {
     if (turn < script_.size()) reaction = script_[turn];
   }
   if (reaction.kind == Reaction::kRejectSend) return;
+  if (reaction.kind == Reaction::kReadPart) return ReadPart(fd, reaction.bytes);
 
   std::string text;
   if (!host::RecvFrame(fd, text)) return;
@@ -106,6 +128,7 @@ void ScriptedDaemon::Handle(int fd) {
   if (react_) reaction = react_(request);
   if (reaction.kind == Reaction::kReply) host::SendFrame(fd, reaction.text);
   if (reaction.kind == Reaction::kRawBytes) SendRaw(fd, reaction.text);
+  if (reaction.kind == Reaction::kOneByOne) SendOneByOne(fd, reaction.text);
 }
 
 std::vector<Json::Value> ScriptedDaemon::Requests() {

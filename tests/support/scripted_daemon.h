@@ -16,11 +16,14 @@ struct Reaction {
   enum Kind {
     kReply,       // reads the request, answers with `text` as one message
     kRawBytes,    // reads the request, sends `text` as it stands, without framing, and closes
+    kOneByOne,    // the same, each byte when the one before has been taken
     kHangUp,      // reads the request and closes without an answer
     kRejectSend,  // closes without reading the request, so that sending a large one fails
+    kReadPart,    // reads `bytes` bytes of the request's frame and closes
   };
   Kind kind = kReply;
   std::string text;
+  std::size_t bytes = 0;
 };
 
 Reaction Success();
@@ -32,8 +35,8 @@ Reaction Reply(const std::string& text);
 // destruction, and serves one connection at a time on a thread of its own.
 class ScriptedDaemon {
  public:
-  // `react` gets each request and runs on the daemon's thread. It cannot choose kRejectSend, since
-  // the request has been read by then.
+  // `react` gets each request and runs on the daemon's thread. It cannot choose kRejectSend or
+  // kReadPart, since the request has been read by then.
   using React = std::function<Reaction(const Json::Value& request)>;
   explicit ScriptedDaemon(React react);
   // Reacts with the elements in order, then with success.
