@@ -17,3 +17,8 @@ if(TEISEIGATRO_SANITIZE)
     -fsanitize=${TEISEIGATRO_SANITIZE} -fno-sanitize-recover=all -fno-omit-frame-pointer)
   target_link_options(teiseigatro_options INTERFACE -fsanitize=${TEISEIGATRO_SANITIZE})
 endif()
+
+if(TEISEIGATRO_FUZZ)
+  target_compile_options(teiseigatro_options INTERFACE -fsanitize=fuzzer-no-link)
+  target_link_options(teiseigatro_options INTERFACE -fsanitize=fuzzer-no-link)
+endif()
