@@ -1,11 +1,12 @@
 # shellcheck shell=bash
 # bash completion for appindex(1)
 
-# Completes to those of the lines on standard input that begin with the current word.
+# Completes to those of the lines on standard input that begin with the current word, in which the
+# shell has put a backslash before a blank.
 _appindex_from() {
   local line
   while IFS= read -r line; do
-    [[ $line != "$cur"* ]] || COMPREPLY+=("$line")
+    [[ $line != "${cur//\\/}"* ]] || COMPREPLY+=("$line")
   done
 }
 
@@ -16,8 +17,13 @@ _appindex_files() {
   _appindex_from < <(compgen "$1" -- "$cur")
 }
 
-# The descriptors of the device, as its programs see them.
+# The descriptors of the device, as its programs see them. The shell quotes what it takes for files.
 _appindex_descriptors() {
+  compopt -o filenames 2>/dev/null
+  _appindex_from < <(_appindex_find)
+}
+
+_appindex_find() {
   local path
   find -L "$root"/var/packages "$root"/usr/tovo/tovoman/webman/modules -maxdepth 7 \
     -name index.conf 2>/dev/null | while IFS= read -r path; do printf '%s\n' "${path#"$root"}"; done
@@ -28,10 +34,15 @@ _appindex_parse() {
   local i
   for ((i = 1; i < COMP_CWORD; ++i)); do
     case ${COMP_WORDS[i]} in
+      --root=*)
+        root=${COMP_WORDS[i]#*=}
+        ;;
       --root)
+        [[ ${COMP_WORDS[i + 1]} != = ]] || ((++i)) # a word of its own, as a rule
         root=${COMP_WORDS[++i]}
         ;;
-      --lang | --limit | --model | --platform | --package | --known | --format)
+      --lang | --limit | --model | --platform | --package | --known | --format | --explain)
+        [[ ${COMP_WORDS[i + 1]} != = ]] || ((++i))
         ((++i))
         ;;
       -*) ;;
@@ -50,6 +61,11 @@ _appindex() {
   local cur=${COMP_WORDS[COMP_CWORD]} previous=${COMP_WORDS[COMP_CWORD - 1]}
   local command='' root=${APPINDEX_ROOT-} options
   COMPREPLY=()
+  if [[ $cur == = ]]; then
+    cur=''
+  elif [[ $previous == = ]]; then
+    previous=${COMP_WORDS[COMP_CWORD - 2]}
+  fi
   _appindex_parse
   case "$command $previous" in
     *' --root' | *' --package')
@@ -91,7 +107,11 @@ _appindex() {
   case $command in
     '') _appindex_words add del reindex process-queue enqueue status search show lint ;;
     enqueue) _appindex_words add del reindex ;;
-    add | del | 'enqueue add' | 'enqueue del' | show) _appindex_from < <(_appindex_descriptors) ;;
+    add | del | 'enqueue add' | 'enqueue del') _appindex_descriptors ;;
+    show)
+      _appindex_descriptors
+      _appindex_files -f
+      ;;
     lint) _appindex_files -f ;;
   esac
 }

@@ -10,6 +10,7 @@ function __appindex_descriptors
     if set -l at (contains -i -- --root $words); and test $at -lt (count $words)
         set root $words[(math $at + 1)]
     end
+    set -l joined (string replace -rf -- '^--root=' '' $words); and set root $joined[-1]
     find -L "$root/var/packages" "$root/usr/tovo/tovoman/webman/modules" -maxdepth 7 \
         -name index.conf 2>/dev/null | string replace -- "$root" ''
 end
@@ -41,6 +42,7 @@ set -l enqueue '__fish_seen_subcommand_from enqueue'
 complete -c appindex -n "$enqueue; and not __fish_seen_subcommand_from add del reindex" \
     -a 'add del reindex'
 complete -c appindex -n '__fish_seen_subcommand_from add del show' -a '(__appindex_descriptors)'
+complete -c appindex -n '__fish_seen_subcommand_from show' -F
 
 set -l search '__fish_seen_subcommand_from search'
 complete -c appindex -n "$search" -l lang -x -a "$langs" -d 'Language code'

@@ -23,6 +23,7 @@
 #include "tool/interrupt.h"
 #include "tool/output.h"
 #include "tool/progress.h"
+#include "tool/refusal.h"
 #include "tool/trial.h"
 
 namespace tool {
@@ -42,7 +43,7 @@ struct Work {
 bool IsAboutDescriptors(const std::exception& exception) {
   const auto* error = dynamic_cast<const Error*>(&exception);
   return error == nullptr || error->code == Error::kJsonError ||
-         error->code == Error::kGeneralError;
+         error->code == Error::kGeneralError || error->code == kRejected;
 }
 
 // Runs `call`. Of a failure that a descriptor is to blame for it says which one, as `culprit` finds
@@ -92,18 +93,15 @@ constexpr Change kDeletion = {index::kDel, index::Del, "Deleted ",
 void Carry(const Context& context, const Change& change,
            const std::vector<std::string>& arguments) {
   const std::vector<std::string> paths = DescriptorPaths(arguments);
-  for (const std::string& path : paths) {
-    const std::string unreadable = WhyUnreadable(path);
-    if (!unreadable.empty()) throw Failure(path + ": " + unreadable);
-  }
+  for (const std::string& path : paths) RequireReadable(path);
   SayWhenInterrupted(change.interrupted);
   Json::Value done(Json::arrayValue);
   for (const std::string& path : paths) {
     const Work work = Run(
         context, [&] { change.call(path, true); },
         [&] {
-          const std::string problem = ProblemOf(change.operation, path);
-          return problem.empty() ? "" : path + ": " + problem;
+          const Problem problem = Trial().ProblemOf(change.operation, path);
+          return problem.fails ? path + ": " + problem.line : "";
         });
     Remark(context, change.done + Sum(work) + ": " + path);
     done.append(ToJson(work));
@@ -117,7 +115,8 @@ void Carry(const Context& context, const Change& change,
 
 void Rebuild(const Context& context) {
   SayWhenInterrupted("the index is incomplete until `appindex reindex` has run to its end");
-  const Work work = Run(context, index::Reindex, FirstProblem);
+  const Work work =
+      Run(context, index::Reindex, [] { return Trial().ProblemOf(index::kReindex, "").line; });
   Remark(context, "Rebuilt the index: " + Sum(work));
   if (context.json) PrintJson(ToJson(work));
 }
@@ -131,12 +130,13 @@ bool IsDaemonGone() { return access(index::elastic::kElasticdSockPath, F_OK) != 
 // The first request of the batch that cannot be carried out.
 std::string CulpritOfBatch() {
   const velkor::MutedLog muted;
+  Trial trial;
   try {
     for (const auto& [path, op] : index::ReadBatch(index::kBatchPath)) {
-      const std::string problem = op == index::kReindex ? FirstProblem() : ProblemOf(op, path);
-      if (problem.empty()) continue;
-      const std::string what = op == index::kReindex ? problem : path + ": " + problem;
-      return what + "; it holds up the whole batch, see `appindex status`";
+      const Problem problem = trial.ProblemOf(op, path);
+      if (!problem.fails) continue;
+      return (op == index::kReindex ? "" : path + ": ") + problem.line +
+             "; it holds up the whole batch";
     }
   } catch (const Error&) {
     // No batch: the failure that is looked into is another one.
@@ -150,9 +150,9 @@ void WorkQueue(const Context& context) {
   const Work work = Run(context, index::ProcessQueue, CulpritOfBatch);
   if (IsWorkLeft() && IsDaemonGone()) {
     throw Failure(std::string(index::elastic::kElasticdSockPath) +
-                      ": the search daemon is not running; the requests stay queued, start "
-                      "tovoelasticd and try again",
-                  kDaemonUnreachable, Error::kElasticdRequestError);
+                      ": the search daemon is not running, and the requests stay queued",
+                  "start tovoelasticd and try again", kDaemonUnreachable,
+                  Error::kElasticdRequestError);
   }
   Remark(context, work.requests == 0
                       ? "Nothing was queued"

@@ -14,11 +14,14 @@
 namespace tool {
 namespace {
 
+constexpr char kAnnotations[] = "github";
+
 struct LintArguments {
   std::vector<std::string> paths;
   std::string package_dir;
   std::string known_file;
   std::string format = "text";
+  bool explain = false;
   std::string explained_tag;
   bool strict = false;
   bool list_tags = false;
@@ -59,7 +62,7 @@ std::string Summary(const lint::Outcome& outcome) {
 void Write(const Context& context, const LintArguments& arguments, const lint::Outcome& outcome) {
   if (context.json) {
     PrintJson(lint::ToJson(outcome));
-  } else if (arguments.format == "github") {
+  } else if (arguments.format == kAnnotations) {
     lint::WriteAnnotations(std::cout, outcome);
   } else {
     lint::WriteText(std::cout, outcome, MayEmphasise(STDOUT_FILENO));
@@ -82,13 +85,16 @@ void CheckPaths(Context& context, const LintArguments& arguments) {
 }
 
 void RunLint(Context& context, const LintArguments& arguments) {
-  const bool checks = !arguments.list_tags && arguments.explained_tag.empty();
+  const bool checks = !arguments.list_tags && !arguments.explain;
   if (!checks && !arguments.paths.empty()) {
     throw CLI::ExcludesError("PATH", "--explain and --list-tags");
   }
+  if (context.json && arguments.format == kAnnotations) {
+    throw CLI::ExcludesError("--format github", "--json");
+  }
   if (arguments.list_tags) {
     ListTags(context);
-  } else if (!arguments.explained_tag.empty()) {
+  } else if (arguments.explain) {
     ExplainTag(context, arguments.explained_tag);
   } else {
     CheckPaths(context, arguments);
@@ -111,12 +117,18 @@ void AddLintCommand(CLI::App& app, Context& context) {
                    R"(The names that there are: {"models": [...], "platforms": [...]})")
       ->type_name("FILE");
   command->add_option("--format", arguments->format, "text, or github for annotations in a CI")
-      ->check(CLI::IsMember({"text", "github"}));
+      ->check(CLI::IsMember({"text", kAnnotations}));
   command->add_flag("--strict", arguments->strict, "Let warnings count as errors do");
-  command->add_option("--explain", arguments->explained_tag, "Tell more about a kind of finding")
-      ->type_name("TAG");
-  command->add_flag("--list-tags", arguments->list_tags, "List the kinds of findings");
-  command->callback([&context, arguments] { RunLint(context, *arguments); });
+  CLI::Option* explain =
+      command
+          ->add_option("--explain", arguments->explained_tag, "Tell more about a kind of finding")
+          ->type_name("TAG");
+  command->add_flag("--list-tags", arguments->list_tags, "List the kinds of findings")
+      ->excludes(explain);
+  command->callback([&context, arguments, explain] {
+    arguments->explain = explain->count() > 0;  // of no text too, which is no tag
+    RunLint(context, *arguments);
+  });
 }
 
 }  // namespace tool

@@ -30,6 +30,7 @@ struct Options {
   std::string lang;
   int limit = kUsualLimit;
   bool explain = false;
+  bool emphasise = false;
   std::vector<std::string> words;
 };
 
@@ -44,7 +45,7 @@ Json::Value Ask(const Options& options, const std::string& lang, const std::stri
   data["id"] = velkor::appindex::elastic::GetAppIndexID(lang);
   data["query"] = query;
   data["limit"] = options.limit;
-  data["explain"] = options.explain;
+  data["explain"] = options.explain || options.emphasise;
   return AskDaemon("search", data);
 }
 
@@ -71,10 +72,29 @@ void PrintExplanation(const Json::Value& hit, bool styled) {
                      part["member"].asString() + " " + Number(part["worth"].asDouble()));
     separator = ", ";
   }
-  std::cout << Styled(text, Look::kFaint, styled) << "\n";
+  std::cout << Styled(OneLine(text), Look::kFaint, styled) << "\n";
 }
 
-void PrintDescription(const std::string& text, const std::string& query, bool styled) {
+Likeness LikenessOf(const std::string& found) {
+  return found == "stem" ? Likeness::kForm : found == "typo" ? Likeness::kSlip : Likeness::kSame;
+}
+
+// What to emphasise in a member of a hit: what was typed, and what was found of it in that member.
+// Keywords are not shown; the title stands for them.
+std::vector<Sought> SoughtIn(const Json::Value& hit, const std::string& member,
+                             const std::string& query) {
+  std::vector<Sought> sought = {{query, Likeness::kSame}};
+  for (const Json::Value& part : hit["explain"]) {
+    const bool by_keyword = member == "title" && part["member"].asString() == "keywords";
+    if (!by_keyword && part["member"].asString() != member) continue;
+    const Likeness likeness = LikenessOf(part["found"].asString());
+    sought.push_back({part["text"].asString(),
+                      by_keyword && likeness == Likeness::kSame ? Likeness::kForm : likeness});
+  }
+  return sought;
+}
+
+void PrintDescription(const std::string& text, const std::vector<Sought>& sought, bool styled) {
   if (text.empty()) return;
   const bool wrap = IsTerminal(STDOUT_FILENO);
   const std::size_t indent = std::strlen(kIndent);
@@ -83,23 +103,24 @@ void PrintDescription(const std::string& text, const std::string& query, bool st
       wrap ? Wrapped(text, columns > indent ? columns - indent : 1)
            : std::vector<std::string>{text};
   for (const std::string& line : lines) {
-    std::cout << kIndent << (styled ? Emphasised(line, query) : line) << "\n";
+    std::cout << kIndent << (styled ? Emphasised(line, sought) : line) << "\n";
   }
 }
 
 void PrintHit(const Json::Value& hit, Json::ArrayIndex number, const std::string& query,
-              bool styled) {
-  const std::string title = hit["title"].asString();
-  std::cout << std::setw(3) << number << ". " << (styled ? Emphasised(title, query) : title) << "  "
-            << Styled("(" + hit["id"].asString() + ")", Look::kFaint, styled) << "\n";
-  PrintDescription(hit["desc"].asString(), query, styled);
-  if (hit.isMember("explain")) PrintExplanation(hit, styled);
+              const Options& options) {
+  const bool styled = options.emphasise;
+  const std::string title = OneLine(hit["title"].asString());
+  std::cout << std::setw(3) << number << ". "
+            << (styled ? Emphasised(title, SoughtIn(hit, "title", query)) : title) << "  "
+            << Styled("(" + OneLine(hit["id"].asString()) + ")", Look::kFaint, styled) << "\n";
+  PrintDescription(OneLine(hit["desc"].asString()), SoughtIn(hit, "desc", query), styled);
+  if (options.explain) PrintExplanation(hit, styled);
 }
 
-void PrintHits(const Json::Value& reply, const std::string& query) {
-  const bool styled = MayEmphasise(STDOUT_FILENO);
+void PrintHits(const Json::Value& reply, const std::string& query, const Options& options) {
   Json::ArrayIndex number = 0;
-  for (const Json::Value& hit : reply["hits"]) PrintHit(hit, ++number, query, styled);
+  for (const Json::Value& hit : reply["hits"]) PrintHit(hit, ++number, query, options);
 }
 
 void RemarkOn(const Context& context, const Json::Value& reply) {
@@ -112,7 +133,8 @@ void RemarkOn(const Context& context, const Json::Value& reply) {
   if (reply["cut"].asBool()) Remark(context, "(the query is long: only its beginning counted)");
 }
 
-void Search(Context& context, const Options& options) {
+void Search(Context& context, Options options) {
+  options.emphasise = !context.json && MayEmphasise(STDOUT_FILENO);
   const std::string lang = options.lang.empty() ? UsersLanguage() : options.lang;
   RequireLanguage(lang);
   const std::string query = Joined(options.words);
@@ -125,7 +147,7 @@ void Search(Context& context, const Options& options) {
     PrintJson(reply);
     return;
   }
-  PrintHits(reply, query);
+  PrintHits(reply, query, options);
   RemarkOn(context, reply);
 }
 

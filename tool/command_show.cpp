@@ -54,19 +54,24 @@ void WriteDocument(const PreviewDocument& made) {
   const char* before = made.lang.c_str();
   for (const char* member : {"title", "desc", "keywords"}) {
     std::cout << "  " << before << "  " << member << std::string(10 - std::strlen(member), ' ')
-              << made.document[member].asString() << "\n";
+              << OneLine(made.document[member].asString()) << "\n";
     before = "   ";
   }
 }
 
+std::string NameOf(const LeftOut& item) {
+  if (!item.id.empty()) return item.id;
+  return item.pointer.empty() ? "the descriptor" : item.pointer;
+}
+
 void WriteText(const Preview& preview) {
   const bool emphasise = MayEmphasise(STDOUT_FILENO);
-  std::cout << lint::DisplayPath(preview.file) << "\n";
+  std::cout << OneLine(lint::DisplayPath(preview.file)) << "\n";
   for (Json::ArrayIndex i = 0; i < preview.records.size(); ++i) {
     const Json::Value& record = preview.records[i];
     const std::string owner = record["owner"].asString();
-    std::cout << "\n" << Styled(record["id"].asString(), Look::kBold, emphasise);
-    if (!owner.empty()) std::cout << "  (a module of " << owner << ")";
+    std::cout << "\n" << Styled(OneLine(record["id"].asString()), Look::kBold, emphasise);
+    if (!owner.empty()) std::cout << "  (a module of " << OneLine(owner) << ")";
     std::cout << "\n";
     // All records of one language stand before those of the next.
     for (std::size_t at = i; at < preview.documents.size(); at += preview.records.size()) {
@@ -75,7 +80,7 @@ void WriteText(const Preview& preview) {
   }
   if (!preview.left_out.empty()) std::cout << "\nLeft out on this device:\n";
   for (const LeftOut& item : preview.left_out) {
-    std::cout << "  " << item.id << ": " << item.reason << "\n";
+    std::cout << "  " << OneLine(NameOf(item)) << ": " << OneLine(item.reason) << "\n";
   }
 }
 
@@ -87,7 +92,8 @@ std::vector<Preview> MakePreviews(const ShowArguments& arguments) {
     }
   }
   if (previews.empty()) {
-    throw Failure(arguments.path + ": there is no index.conf in it or up to five levels below");
+    throw Failure(arguments.path + ": there is no index.conf in it or up to five levels below",
+                  "name a descriptor, or a directory that holds one");
   }
   return previews;
 }
@@ -124,6 +130,7 @@ void AddShowCommand(CLI::App& app, Context& context) {
       ->required();
   command->add_option("--lang", arguments->langs, "Only in this language; may be repeated")
       ->type_name("LANG")
+      ->allow_extra_args(false)  // what follows may be the path
       ->check(CLI::IsMember(velkor::appindex::GetSupportedLangs()));
   command->add_option("--model", arguments->options.model, "As on a device of this model")
       ->type_name("MODEL");

@@ -19,7 +19,8 @@ void AddStatusCommand(CLI::App& app, Context& context) {
     } else {
       std::cout << ToText(status);
     }
-    if (!status.daemon_problem.empty()) context.exit_code = kDaemonUnreachable;
+    if (status.daemon_problem.empty()) return;
+    context.exit_code = status.daemon_refuses ? kFailed : kDaemonUnreachable;
   });
 }
 

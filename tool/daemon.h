@@ -3,15 +3,23 @@
 
 #include <json/value.h>
 
+#include <chrono>
 #include <string>
 
 namespace tool {
 
+// How long the daemon has to take the connection, and then to answer. The first request for an
+// index waits until all of it has been read, and a commit keeps others waiting.
+constexpr std::chrono::seconds kConnectPatience(10);
+constexpr std::chrono::seconds kAnswerPatience(60);
+
 // Sends a command of doc/protocol.md and returns the reply, which reports success. Waits for the
-// answer, but not for a daemon that is not there.
+// answer as long as that, but not for a daemon that is not there. Uses SIGALRM and its timer.
 //
-// Throws velkor::Error: 913 when the daemon does not answer, else the daemon's own code.
+// Throws a Failure with code 913 when the daemon does not answer, or not in a way that can be
+// understood; else velkor::Error with the daemon's own code.
 Json::Value AskDaemon(const std::string& command,
-                      const Json::Value& data = Json::Value(Json::objectValue));
+                      const Json::Value& data = Json::Value(Json::objectValue),
+                      std::chrono::microseconds patience = kAnswerPatience);
 
 }  // namespace tool

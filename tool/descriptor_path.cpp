@@ -1,5 +1,7 @@
 #include "tool/descriptor_path.h"
 
+#include <unistd.h>
+
 #include <cerrno>
 #include <cstring>
 #include <filesystem>
@@ -36,7 +38,8 @@ std::string FindIn(const std::string& dir) {
   const velkor::MutedLog muted;
   std::string conf_path;
   if (!index::FindIndexConfByAppRoot(conf_path, dir + "/", 0)) {
-    throw Failure(dir + ": there is no index.conf in it, nor up to five levels below");
+    throw Failure(dir + ": there is no index.conf in it, nor up to five levels below",
+                  "name a descriptor, or a directory that holds one");
   }
   return conf_path;
 }
@@ -45,16 +48,22 @@ std::string FindIn(const std::string& dir) {
 
 std::string DescriptorPath(const std::string& argument) {
   std::string path = Absolute(argument);
+  if (access(path.c_str(), F_OK) != 0) {
+    const int error = errno;
+    throw Failure(path + ": " + std::strerror(error), AdviceOn(error));
+  }
   if (velkor::IsDirExist(path + "/", false)) path = FindIn(path);
   if (velkor::Basename(path) != index::kIndexConf) {
-    throw Failure(path + ": a descriptor is named index.conf; others are not read");
+    throw Failure(path + ": others than index.conf are not read",
+                  "a descriptor is named index.conf: rename it");
   }
   if (!IsInApplication(path)) {
     throw Failure(path + ": not in a directory of /var/packages or " +
-                  "/usr/tovo/tovoman/webman/modules, where applications are");
+                      "/usr/tovo/tovoman/webman/modules, where applications are",
+                  "install it there; `appindex lint` and `show` look at it anywhere");
   }
   if (!velkor::IsFileExist(velkor::RealPath(path))) {
-    throw Failure(path + ": there is no such file");
+    throw Failure(path + ": not a regular file", AdviceOn(EINVAL));
   }
   return path;
 }
@@ -65,12 +74,22 @@ std::vector<std::string> DescriptorPaths(const std::vector<std::string>& argumen
   return paths;
 }
 
-std::string WhyUnreadable(const std::string& conf_path) {
+void RequireReadable(const std::string& conf_path) {
   Json::Value root;
   errno = 0;
-  if (velkor::fromFile(root, conf_path)) return "";
-  if (errno != 0) return std::string("cannot be read: ") + std::strerror(errno);
-  return "not strict JSON; `appindex lint` shows where";
+  if (velkor::fromFile(root, conf_path)) return;
+  const int error = errno;
+  if (error == 0) throw Failure(conf_path + ": not strict JSON", "`appindex lint` shows where");
+  throw Failure(conf_path + ": cannot be read: " + WhyNotRead(error), AdviceOn(error));
+}
+
+std::string WhyUnreadable(const std::string& conf_path) {
+  try {
+    RequireReadable(conf_path);
+  } catch (const Failure& failure) {
+    return failure.cause().substr(conf_path.size() + 2);
+  }
+  return "";
 }
 
 }  // namespace tool

@@ -14,8 +14,11 @@ namespace tool {
 std::string DescriptorPath(const std::string& argument);
 std::vector<std::string> DescriptorPaths(const std::vector<std::string>& arguments);
 
-// Why the library would make nothing of the file: it cannot be read, or is not JSON. Empty when it
-// would.
+// Throws Failure when the library would make nothing of the file: it cannot be read, or is not
+// JSON.
+void RequireReadable(const std::string& conf_path);
+
+// The cause alone, without the path; empty when there is none.
 std::string WhyUnreadable(const std::string& conf_path);
 
 }  // namespace tool

@@ -11,6 +11,8 @@
 #include <utility>
 #include <vector>
 
+#include "host/searchd/edit_distance.h"
+#include "host/searchd/folding.h"
 #include "tool/output.h"
 
 namespace tool {
@@ -62,16 +64,75 @@ bool BeginsWord(const icu::UnicodeString& text, int at) {
   return at == 0 || u_isalnum(text.char32At(text.moveIndex32(at, -1))) == 0;
 }
 
+// The words of a text as its language knows them.
+std::vector<Part> WordsIn(const icu::UnicodeString& text) {
+  UErrorCode status = U_ZERO_ERROR;
+  const std::unique_ptr<icu::BreakIterator> breaks(
+      icu::BreakIterator::createWordInstance(icu::Locale::getRoot(), status));
+  std::vector<Part> words;
+  if (U_FAILURE(status) != 0) return words;
+  breaks->setText(text);
+  int begin = breaks->first();
+  for (int end = breaks->next(); end != icu::BreakIterator::DONE; end = breaks->next()) {
+    if (breaks->getRuleStatus() != UBRK_WORD_NONE) words.emplace_back(begin, end);
+    begin = end;
+  }
+  return words;
+}
+
+std::u32string Folded(const icu::UnicodeString& word) {
+  const icu::UnicodeString folded = searchd::WithoutAccents(searchd::Fold(word, false));
+  std::u32string letters;
+  for (int at = 0; at < folded.length(); at = folded.moveIndex32(at, 1)) {
+    letters += static_cast<char32_t>(folded.char32At(at));
+  }
+  return letters;
+}
+
+// How many letters two forms of a word begin with together; 0 for two words.
+std::size_t SharedBeginning(const std::u32string& a, const std::u32string& b) {
+  constexpr std::size_t kLeast = 3;
+  const std::size_t most = std::min(a.size(), b.size());
+  std::size_t shared = 0;
+  while (shared < most && a[shared] == b[shared]) ++shared;
+  return shared >= kLeast && 2 * shared >= most ? shared : 0;
+}
+
+std::size_t Alike(const std::u32string& word, const std::u32string& sought, Likeness likeness) {
+  if (likeness == Likeness::kForm) return SharedBeginning(word, sought);
+  return likeness == Likeness::kSlip && searchd::BeginsWithinOneEdit(word, sought) ? 1 : 0;
+}
+
+// The words of the text that are most like the one that is sought.
+std::vector<Part> FindAlike(const icu::UnicodeString& text, const icu::UnicodeString& word,
+                            Likeness likeness) {
+  std::vector<Part> parts;
+  std::size_t most = 1;
+  const std::u32string sought = Folded(word);
+  for (const Part& part : WordsIn(text)) {
+    const icu::UnicodeString found = text.tempSubStringBetween(part.first, part.second);
+    const std::size_t alike = Alike(Folded(found), sought, likeness);
+    if (alike > most) parts.clear();
+    if (alike >= most) parts.push_back(part);
+    most = std::max(most, alike);
+  }
+  return parts;
+}
+
 // The places to emphasise, in order; they may overlap.
-std::vector<Part> Places(const icu::UnicodeString& text, const icu::UnicodeString& query) {
+std::vector<Part> Places(const icu::UnicodeString& text, const std::vector<Sought>& sought) {
   std::vector<Part> inside;
   std::vector<Part> beginnings;
   const std::unique_ptr<icu::Collator> collator = Letters();
   auto* letters = dynamic_cast<icu::RuleBasedCollator*>(collator.get());  // which others are not
   if (letters == nullptr) return beginnings;
-  for (const icu::UnicodeString& word : Words(query)) {
-    for (const Part& part : Find(text, word, *letters)) {
-      (BeginsWord(text, part.first) ? beginnings : inside).push_back(part);
+  for (const Sought& one : sought) {
+    for (const icu::UnicodeString& word : Words(icu::UnicodeString::fromUTF8(one.text))) {
+      std::vector<Part> found = Find(text, word, *letters);
+      if (found.empty()) found = FindAlike(text, word, one.likeness);
+      for (const Part& part : found) {
+        (BeginsWord(text, part.first) ? beginnings : inside).push_back(part);
+      }
     }
   }
   std::vector<Part>& places = beginnings.empty() ? inside : beginnings;
@@ -86,11 +147,11 @@ std::string Utf8(const icu::UnicodeString& text) {
 
 }  // namespace
 
-std::string Emphasised(const std::string& text, const std::string& query) {
+std::string Emphasised(const std::string& text, const std::vector<Sought>& sought) {
   const icu::UnicodeString unicode = icu::UnicodeString::fromUTF8(text);
   std::string emphasised;
   int done = 0;
-  for (const auto& [begin, end] : Places(unicode, icu::UnicodeString::fromUTF8(query))) {
+  for (const auto& [begin, end] : Places(unicode, sought)) {
     if (begin < done) continue;
     emphasised += Utf8(unicode.tempSubStringBetween(done, begin));
     emphasised += Styled(Utf8(unicode.tempSubStringBetween(begin, end)), Look::kBold, true);

@@ -2,12 +2,17 @@
 #include <fcntl.h>
 
 #include <CLI/CLI.hpp>
+#include <cerrno>
+#include <cstdio>
+#include <cstring>
 #include <exception>
 #include <iostream>
+#include <string>
 
 #include "host/device_root.h"
 #include "tool/context.h"
 #include "tool/failure.h"
+#include "tool/output.h"
 
 namespace {
 
@@ -27,6 +32,7 @@ void AddOptions(CLI::App& app, tool::Context& context) {
 }
 
 void AddCommands(CLI::App& app, tool::Context& context) {
+  app.fallthrough();  // handed down to the commands when they are made
   tool::AddIndexCommands(app, context);
   tool::AddEnqueueCommand(app, context);
   tool::AddStatusCommand(app, context);
@@ -34,7 +40,6 @@ void AddCommands(CLI::App& app, tool::Context& context) {
   tool::AddShowCommand(app, context);
   tool::AddLintCommand(app, context);
   app.require_subcommand(1);
-  app.fallthrough();
 }
 
 void EnterRoot(tool::Context& context) {
@@ -48,8 +53,18 @@ int Answer(const CLI::App& app, const CLI::ParseError& error) {
     app.exit(error);
     return tool::kDone;
   }
-  std::cerr << "appindex: " << error.what() << "; `appindex --help` tells more\n";
+  std::cerr << "appindex: " << tool::OneLine(error.what()) << "; `appindex --help` tells more\n";
   return tool::kUsage;
+}
+
+void FlushOutput() {
+  if (std::cout.flush()) return;
+  // A write that failed before has not kept its cause, but fails again.
+  std::clearerr(stdout);
+  std::fputc('\n', stdout);
+  std::fflush(stdout);
+  throw tool::Failure(std::string("standard output cannot be written: ") + std::strerror(errno),
+                      "direct it to another place");
 }
 
 }  // namespace
@@ -62,7 +77,7 @@ int main(int argc, char** argv) {
   app.parse_complete_callback([&context] { EnterRoot(context); });  // before that of the command
   try {
     app.parse(argc, argv);
-    if (!std::cout.flush()) throw tool::Failure("standard output cannot be written");
+    FlushOutput();
     return context.exit_code;
   } catch (const CLI::ParseError& error) {
     return Answer(app, error);

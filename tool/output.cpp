@@ -48,7 +48,7 @@ std::string Styled(const std::string& text, Look look, bool may_emphasise) {
 void PrintJson(const Json::Value& value) { std::cout << velkor::toString(value) << "\n"; }
 
 void Remark(const Context& context, const std::string& text) {
-  if (!context.quiet) std::cerr << text << "\n";
+  if (!context.quiet) std::cerr << OneLine(text) << "\n";
 }
 
 std::string Counted(std::size_t count, const std::string& noun) {
@@ -65,6 +65,18 @@ std::string Shortened(const std::string& text, std::size_t columns) {
     last = at;
   }
   return text;
+}
+
+std::string OneLine(const std::string& text) {
+  std::string line;
+  for (std::size_t at = 0; at < text.size(); ++at) {
+    const auto byte = static_cast<unsigned char>(text[at]);
+    const auto next = static_cast<unsigned char>(at + 1 < text.size() ? text[at + 1] : 0);
+    const bool is_c1 = byte == 0xC2U && next >= 0x80U && next < 0xA0U;  // U+0080 to U+009F
+    line += byte < 0x20U || byte == 0x7FU || is_c1 ? ' ' : text[at];
+    if (is_c1) ++at;
+  }
+  return line;
 }
 
 std::string Duration(long long seconds) {

@@ -35,6 +35,10 @@ std::string Counted(std::size_t count, const std::string& noun);
 // are two columns wide count as one.
 std::string Shortened(const std::string& text, std::size_t columns);
 
+// `text` without what would end the line or command a terminal, as the names of files may: a blank
+// in place of each control character.
+std::string OneLine(const std::string& text);
+
 // A length of time as a person says it: "45 s", "12 min", "3 h 5 min", "2 days".
 std::string Duration(long long seconds);
 

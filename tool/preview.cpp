@@ -6,7 +6,6 @@
 #include <filesystem>
 
 #include "appindex/device_identity.h"
-#include "appindex/elastic_control_internal.h"
 #include "appindex/error.h"
 #include "appindex/index_mgr_internal.h"
 #include "appindex/utilities/file_utils.h"
@@ -17,6 +16,7 @@
 #include "tool/failure.h"
 #include "tool/lint/report.h"
 #include "tool/lint/source_text.h"
+#include "tool/refusal.h"
 
 namespace tool {
 namespace {
@@ -27,14 +27,17 @@ namespace index = velkor::appindex;
 Json::Value ReadDescriptor(const std::string& file) {
   std::string text;
   if (!velkor::ReadRegularFile(file, velkor::kMaxJsonFileBytes, text)) {
-    throw Failure(lint::DisplayPath(file) + ": " + std::strerror(errno));
+    const int error = errno;
+    throw Failure(lint::DisplayPath(file) + ": cannot be read: " + WhyNotRead(error),
+                  AdviceOn(error));
   }
   const lint::SourceText source(std::move(text));
   Json::Value root;
   if (const std::optional<lint::SyntaxError> error = lint::ParseJson(source, root)) {
     const lint::Position at = source.At(error->offset);
     throw Failure(lint::DisplayPath(file) + ":" + std::to_string(at.line) + ":" +
-                  std::to_string(at.column) + ": " + error->message);
+                      std::to_string(at.column) + ": " + error->message,
+                  "`appindex lint --explain json-syntax` tells more");
   }
   return root;
 }
@@ -81,8 +84,33 @@ std::string StoppedBy(const Json::Value& object) {
   return "";
 }
 
-std::vector<LeftOut> FindLeftOut(const Json::Value& root) {
+void AppendNothing(std::vector<LeftOut>& left_out, const lint::Node& node, const char* wanted) {
+  left_out.push_back({"", node.pointer, "type", std::string("gives nothing: ") + wanted});
+}
+
+// What stands in the place of entries and modules and is none.
+std::vector<LeftOut> FindNothing(const Json::Value& root) {
+  constexpr char kNoObject[] = "not an object";
   std::vector<LeftOut> left_out;
+  const lint::Node top{&root, ""};
+  const std::vector<lint::Node> entries =
+      root.isArray() ? lint::ElementsOf(top) : std::vector<lint::Node>{top};
+  for (const lint::Node& entry : entries) {
+    if (!entry.value->isObject()) AppendNothing(left_out, entry, kNoObject);
+    if (!entry.Has("modules")) continue;
+    const lint::Node modules = entry.Member("modules");
+    if (!modules.value->isArray() && !modules.value->isObject()) {
+      AppendNothing(left_out, modules, "not a list");
+    }
+    for (const lint::Node& module : lint::ElementsOf(modules)) {
+      if (!module.value->isObject()) AppendNothing(left_out, module, kNoObject);
+    }
+  }
+  return left_out;
+}
+
+std::vector<LeftOut> FindLeftOut(const Json::Value& root) {
+  std::vector<LeftOut> left_out = FindNothing(root);
   for (const lint::Item& item : lint::ItemsOf(root)) {
     const std::string id = lint::IdOf(item);
     if (item.is_module && !StoppedBy(*item.entry.value).empty()) {
@@ -107,15 +135,16 @@ void AppendDocuments(Preview& preview, const lint::Package& package, index::Stri
   for (const Json::Value& record : preview.records) {
     const Json::Value installed = AsInstalled(package, preview.file, record);
     Json::Value document = index::MakeDocument(pool, lang, installed);
-    index::elastic::UpsertRequest(lang, document);  // throws where sending would
+    RequireTaken(lang, document);
     preview.documents.push_back({lang, std::move(document)});
   }
 }
 
 [[noreturn]] void Fail(const std::string& file, const std::exception& exception) {
   const std::string path = lint::DisplayPath(file);
-  throw Failure(path + ": adding it would fail: " + Explain(exception).line + "; `appindex lint " +
-                path + "` says where");
+  const Report report = Explain(exception);
+  throw Failure(path + ": adding it would fail: " + report.cause,
+                "`appindex lint " + path + "` says where", report.exit_code, report.code);
 }
 
 }  // namespace
@@ -131,8 +160,10 @@ Preview MakePreview(const lint::Package& package, const std::string& file,
     preview.left_out = FindLeftOut(root);
     preview.records = index::FindIndexables(file);
   } catch (const velkor::Error& error) {
-    throw Failure(lint::DisplayPath(file) + ": " + Explain(error).line +
-                  "; --model and --platform say for which device to show it");
+    const Report report = Explain(error);
+    throw Failure(lint::DisplayPath(file) + ": " + report.cause,
+                  "--model and --platform say for which device to show it", report.exit_code,
+                  report.code);
   }
   index::StringPool pool;
   try {
@@ -141,6 +172,8 @@ Preview MakePreview(const lint::Package& package, const std::string& file,
     Fail(file, error);
   } catch (const Json::Exception& exception) {
     Fail(file, exception);
+  } catch (const Failure& failure) {
+    Fail(file, failure);
   }
   return preview;
 }

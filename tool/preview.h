@@ -20,10 +20,10 @@ struct PreviewOptions {
 
 // An entry or a module that is left out, mostly by a filter.
 struct LeftOut {
-  std::string id;
+  std::string id;       // empty when it has none
   std::string pointer;  // JSON pointer to the entry or module
-  // "enable", "disable", "entry" for a module whose entry is left out, or "params" for a module
-  // without an id.
+  // "enable", "disable", "entry" for a module whose entry is left out, "params" for a module
+  // without an id, or "type" for what is neither an entry nor a module.
   std::string filter;
   std::string reason;  // for people: which list, which value
 };

@@ -13,7 +13,6 @@
 #include "appindex/utilities/file_utils.h"
 #include "common/check.h"
 #include "common/file_io.h"
-#include "tool/trial.h"
 
 namespace tool {
 namespace {
@@ -28,16 +27,15 @@ std::size_t CountLines(const std::string& text) {
   return lines;
 }
 
-// Seconds since the file was last written.
-long long Age(const std::string& path) {
+// When the file was last written: moving it aside as a batch changes nothing of that.
+std::time_t Written(const std::string& path, std::time_t now) {
   struct stat status {};
-  if (stat(path.c_str(), &status) != 0) return 0;
-  return std::max<long long>(0, std::time(nullptr) - status.st_mtime);
+  return stat(path.c_str(), &status) == 0 ? std::min(status.st_mtime, now) : now;
 }
 
-void AppendSteps(std::vector<Step>& steps, const RequestFile& file) {
+void AppendSteps(std::vector<Step>& steps, Trial& trial, const RequestFile& file) {
   for (const auto& [path, op] : file.requests) {
-    steps.push_back({&file, op, path, ProblemOf(op, path)});
+    steps.push_back({&file, op, path, trial.ProblemOf(op, path)});
   }
 }
 
@@ -55,7 +53,9 @@ RequestFile ReadRequestFile(const std::string& path) {
   }
   file.state = RequestFile::kReadable;
   file.lines = CountLines(text);
-  file.age = Age(path);
+  const std::time_t now = std::time(nullptr);
+  file.written = Written(path, now);
+  file.age = now - file.written;
   try {
     const velkor::MutedLog muted;
     file.requests = index::ReadBatch(path);
@@ -81,8 +81,9 @@ const char* NameOfOperation(int op) {
 
 std::vector<Step> Order(const RequestFile& batch, const RequestFile& queue) {
   std::vector<Step> steps;
-  AppendSteps(steps, batch);
-  AppendSteps(steps, queue);
+  Trial trial;
+  AppendSteps(steps, trial, batch);
+  AppendSteps(steps, trial, queue);
   return steps;
 }
 

@@ -3,10 +3,12 @@
 
 #include <json/value.h>
 
+#include <ctime>
 #include <string>
 #include <vector>
 
 #include "appindex/index_queue_internal.h"
+#include "tool/trial.h"
 
 namespace tool {
 
@@ -18,7 +20,8 @@ struct RequestFile {
   State state = kMissing;
   std::string cause;                 // why it is unreadable
   std::size_t lines = 0;             // that are not empty
-  long long age = 0;                 // seconds since the last line was written
+  std::time_t written = 0;           // when the last line was
+  long long age = 0;                 // seconds since then
   velkor::appindex::Batch requests;  // folded, in the order in which they are carried out
 };
 
@@ -33,7 +36,7 @@ struct Step {
   const RequestFile* from;
   int op;
   std::string path;
-  std::string problem;  // why it will fail or do nothing, as far as can be told; empty: none
+  Problem problem;  // as far as can be told
 };
 
 // The steps of the batch, then those of the queue.

@@ -1,10 +1,13 @@
 #include "tool/status.h"
 
+#include <algorithm>
+#include <ctime>
 #include <exception>
 
 #include "appindex/config.h"
 #include "appindex/device_identity.h"
 #include "appindex/elastic_control.h"
+#include "appindex/error.h"
 #include "common/check.h"
 #include "tool/daemon.h"
 #include "tool/failure.h"
@@ -43,6 +46,22 @@ std::map<std::string, Index> ReadIndexes() {
   return indexes;
 }
 
+// As RFC 3339 writes it, in universal time.
+std::string TimeText(std::time_t time) {
+  std::tm parts{};
+  char text[32];
+  gmtime_r(&time, &parts);
+  std::strftime(text, sizeof(text), "%Y-%m-%dT%H:%M:%SZ", &parts);
+  return text;
+}
+
+void AddProblem(Json::Value& value, const Problem& problem) {
+  if (problem.line.empty()) return;
+  value["problem"] = problem.line;
+  value["fails"] = problem.fails;
+  if (problem.code != 0) value["code"] = problem.code;
+}
+
 Json::Value ToJson(const RequestFile& file) {
   Json::Value value;
   value["path"] = file.path;
@@ -51,6 +70,7 @@ Json::Value ToJson(const RequestFile& file) {
   if (file.state != RequestFile::kReadable) return value;
   value["lines"] = Json::UInt64(file.lines);
   value["requests"] = Json::UInt64(file.requests.size());
+  value["written"] = TimeText(file.written);
   value["age_seconds"] = Json::Int64(file.age);
   return value;
 }
@@ -60,7 +80,7 @@ Json::Value ToJson(const Step& step, const Status& status) {
   value["from"] = step.from == &status.batch ? "batch" : "queue";
   value["op"] = NameOfOperation(step.op);
   value["path"] = step.path;
-  if (!step.problem.empty()) value["problem"] = step.problem;
+  AddProblem(value, step.problem);
   return value;
 }
 
@@ -72,6 +92,7 @@ Json::Value ToJson(const Lock& lock) {
     Json::Value one;
     one["pid"] = holder.pid;
     one["program"] = holder.program;
+    if (holder.has_ended) one["ended"] = true;
     value["holders"].append(one);
   }
   return value;
@@ -99,6 +120,19 @@ Json::Value ToJson(const std::string& lang, const Index& found) {
 
 }  // namespace
 
+const Step* Status::FirstFailing(const RequestFile& file) const {
+  const auto found = std::find_if(order.begin(), order.end(), [&](const Step& step) {
+    return step.from == &file && step.problem.fails;
+  });
+  return found == order.end() ? nullptr : &*found;
+}
+
+bool Status::IsWorked() const {
+  return std::any_of(locks.begin(), locks.end(), [](const Lock& lock) {
+    return lock.path == index::kProcessLockPath && !lock.holders.empty();
+  });
+}
+
 bool Status::IsEven() const {
   for (const auto& [lang, found] : indexes) {
     const Index& first = indexes.begin()->second;
@@ -117,6 +151,13 @@ void Gather(Status& status, int proc) {
   status.version = ReadVersion();
   try {
     status.indexes = ReadIndexes();
+  } catch (const Json::Exception& exception) {
+    status.daemon_problem =
+        std::string("the search daemon's answer is not as it must be: ") + exception.what();
+  } catch (const velkor::Error& error) {
+    status.daemon_problem = Explain(error).line;
+    status.daemon_refuses = true;
+    status.daemon_code = error.code;
   } catch (const std::exception& exception) {
     status.daemon_problem = Explain(exception).line;
   }
@@ -124,17 +165,26 @@ void Gather(Status& status, int proc) {
 
 Json::Value ToJson(const Status& status) {
   Json::Value value;
-  value["daemon"]["reachable"] = status.daemon_problem.empty();
+  value["daemon"]["reachable"] = status.daemon_problem.empty() || status.daemon_refuses;
   if (!status.daemon_problem.empty()) value["daemon"]["problem"] = status.daemon_problem;
+  if (status.daemon_refuses) value["daemon"]["code"] = status.daemon_code;
   value["batch"] = ToJson(status.batch);
   value["queue"] = ToJson(status.queue);
+  for (const RequestFile* file : {&status.batch, &status.queue}) {
+    const Step* failing = status.FirstFailing(*file);
+    if (failing == nullptr) continue;
+    value["held_up_by"] = ToJson(*failing, status);
+    value["held_up_by"]["since"] = TimeText(file->written);
+    value["held_up_by"]["waiting_seconds"] = Json::Int64(file->age);
+    break;
+  }
   for (const char* list : {"order", "locks", "indexes"})
     value[list] = Json::Value(Json::arrayValue);
   for (const Step& step : status.order) value["order"].append(ToJson(step, status));
   for (const Lock& lock : status.locks) value["locks"].append(ToJson(lock));
   value["version"] = ToJson(status.version);
   for (const auto& [lang, found] : status.indexes) value["indexes"].append(ToJson(lang, found));
-  value["even"] = status.IsEven();
+  if (!status.indexes.empty()) value["even"] = status.IsEven();
   return value;
 }
 

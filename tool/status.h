@@ -32,7 +32,9 @@ struct Lock {
 };
 
 struct Status {
-  std::string daemon_problem;  // empty: the search daemon answers
+  std::string daemon_problem;   // empty: the search daemon answers
+  bool daemon_refuses = false;  // it does, but does not say what indexes there are
+  int daemon_code = 0;          // of its refusal
   RequestFile batch;
   RequestFile queue;
   std::vector<Step> order;  // points to `batch` and `queue`
@@ -40,8 +42,14 @@ struct Status {
   Version version;
   std::map<std::string, Index> indexes;  // by language; empty when the daemon does not answer
 
+  // The first request of the file that will fail, for which all of them wait; null: none is known.
+  const Step* FirstFailing(const RequestFile& file) const;
+
+  // Whether a process works the queue.
+  bool IsWorked() const;
+
   // Whether there are as many documents in each language, as there are when nothing was
-  // interrupted.
+  // interrupted; nothing is known of it without `indexes`.
   bool IsEven() const;
 
   Status() = default;

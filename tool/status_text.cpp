@@ -1,33 +1,78 @@
 // The state of everything, for a reader.
 #include <algorithm>
+#include <cstring>
+#include <ctime>
 #include <iomanip>
 #include <sstream>
+#include <string>
+#include <vector>
 
-#include "appindex/elastic_control_internal.h"
 #include "tool/output.h"
 #include "tool/status.h"
 
 namespace tool {
 namespace {
 
-constexpr int kHeadColumns = 16;
+constexpr std::size_t kColumns = 80;
+constexpr std::size_t kHeadColumns = 16;
 constexpr std::size_t kIndexesPerLine = 5;
 constexpr std::size_t kCell = 11;
 constexpr std::size_t kStepsShown = 20;
+constexpr std::size_t kStepIndent = 4;
 
 void Begin(std::ostream& out, const std::string& head) {
-  out << std::left << std::setw(kHeadColumns) << head;
+  out << std::left << std::setw(static_cast<int>(kHeadColumns)) << head;
 }
 
 void Continue(std::ostream& out) { out << std::string(kHeadColumns, ' '); }
 
+using Words = std::vector<std::string>;
+
+Words WordsOf(const std::string& text) {
+  std::istringstream stream(OneLine(text));
+  Words words;
+  std::string word;
+  while (stream >> word) words.push_back(word);
+  return words;
+}
+
+// Goes on `indent` columns behind the head, in as many lines as it takes, and ends the last. A path
+// that is longer than a line stands there as it is, any other such word is cut.
+void WriteWords(std::ostream& out, const Words& words, std::size_t indent = 0) {
+  const std::size_t columns = kColumns - kHeadColumns - indent;
+  std::size_t written = 0;
+  for (std::string word : words) {
+    if (word[0] != '/') word = Shortened(word, columns);
+    if (written > 0 && written + 1 + word.size() > columns) {
+      out << "\n" << std::string(kHeadColumns + indent, ' ');
+      written = 0;
+    } else if (written > 0) {
+      out << " ";
+      ++written;
+    }
+    out << word;
+    written += word.size();
+  }
+  out << "\n";
+}
+
+void WriteProblem(std::ostream& out, const Problem& problem, std::size_t indent = 0) {
+  constexpr char kMark[] = "! ";
+  Continue(out);
+  out << std::string(indent, ' ') << kMark;
+  Words words = WordsOf(problem.line);
+  if (problem.code != 0) words.push_back("(code " + std::to_string(problem.code) + ")");
+  WriteWords(out, words, indent + std::strlen(kMark));
+}
+
 void WriteDaemon(std::ostream& out, const Status& status) {
   Begin(out, "Search daemon");
-  out << (status.daemon_problem.empty() ? "answers" : "does not answer") << "\n";
+  out << (status.daemon_problem.empty() ? "answers"
+          : status.daemon_refuses       ? "refuses"
+                                        : "does not answer")
+      << "\n";
   if (!status.daemon_problem.empty()) {
-    Continue(out);
-    out << "start tovoelasticd; its socket is " << velkor::appindex::elastic::kElasticdSockPath
-        << "\n";
+    WriteProblem(out, {status.daemon_problem, false, status.daemon_code});
   }
 }
 
@@ -47,6 +92,40 @@ void WriteFile(std::ostream& out, const std::string& head, const RequestFile& fi
   }
 }
 
+// In the device's own time.
+std::string TimeText(std::time_t time) {
+  std::tm parts{};
+  char text[32];
+  localtime_r(&time, &parts);
+  std::strftime(text, sizeof(text), "%Y-%m-%d %H:%M", &parts);
+  return text;
+}
+
+std::string NameOf(const Step& step) {
+  return step.path.empty() ? "everything" : OneLine(step.path);
+}
+
+void WriteCulprit(std::ostream& out, const char* head, const Step& step) {
+  Begin(out, head);
+  out << NameOfOperation(step.op) << " " << NameOf(step) << "\n";
+  WriteProblem(out, step.problem);
+}
+
+void WriteWaiting(std::ostream& out, const Status& status) {
+  if (const Step* step = status.FirstFailing(status.batch)) {
+    WriteCulprit(out, "Held up by", *step);
+    Continue(out);
+    out << "all of the batch waits for it, since " << TimeText(status.batch.written) << "\n";
+  } else if (status.batch.state == RequestFile::kReadable && status.daemon_problem.empty() &&
+             !status.IsWorked()) {
+    Begin(out, "Left because");
+    out << "not known here, no request of it fails; the system log may say\n";
+  }
+  if (const Step* step = status.FirstFailing(status.queue)) {
+    WriteCulprit(out, "Will fail", *step);
+  }
+}
+
 void WriteOrder(std::ostream& out, const Status& status) {
   std::size_t number = 0;
   for (const Step& step : status.order) {
@@ -57,10 +136,9 @@ void WriteOrder(std::ostream& out, const Status& status) {
     }
     number == 0 ? Begin(out, "To be done") : Continue(out);
     out << std::right << std::setw(2) << ++number << ". " << std::left << std::setw(8)
-        << NameOfOperation(step.op) << (step.path.empty() ? "everything" : step.path) << "\n";
-    if (step.problem.empty()) continue;
-    Continue(out);
-    out << "    ! " << step.problem << "\n";
+        << NameOfOperation(step.op) << NameOf(step) << "\n";
+    if (step.problem.line.empty()) continue;
+    WriteProblem(out, step.problem, kStepIndent);
   }
 }
 
@@ -68,8 +146,14 @@ void WriteLocks(std::ostream& out, const Status& status) {
   for (const Lock& lock : status.locks) {
     for (const LockHolder& holder : lock.holders) {
       Begin(out, "Locked");
-      out << lock.path << " by " << (holder.program.empty() ? "process" : holder.program) << " ("
-          << holder.pid << ")\n";
+      const std::string pid = " (" + std::to_string(holder.pid) + ")";
+      WriteWords(out, WordsOf(lock.path + " by " +
+                              (holder.has_ended
+                                   ? "a process that cannot be seen; the one that took it has "
+                                     "ended"
+                               : holder.program.empty() ? "process"
+                                                        : holder.program) +
+                              pid));
     }
   }
 }
@@ -77,7 +161,7 @@ void WriteLocks(std::ostream& out, const Status& status) {
 void WriteVersion(std::ostream& out, const Version& version) {
   Begin(out, "System version");
   if (!version.problem.empty()) {
-    out << "not known: " << version.problem << "\n";
+    WriteWords(out, WordsOf("not known: " + version.problem));
     return;
   }
   out << version.current << "\n";
@@ -111,7 +195,7 @@ void WriteIndexes(std::ostream& out, const std::map<std::string, Index>& indexes
   for (const auto& [lang, found] : indexes) {
     if (found.state != Index::kDamaged) continue;
     Begin(out, "Damaged");
-    out << lang << ": " << found.damage << "\n";
+    WriteWords(out, WordsOf(lang + ": " + found.damage));
   }
 }
 
@@ -122,13 +206,14 @@ std::string ToText(const Status& status) {
   WriteDaemon(out, status);
   WriteFile(out, "Batch left", status.batch, "; it comes first");
   WriteFile(out, "Queue", status.queue, "");
+  WriteWaiting(out, status);
   WriteOrder(out, status);
   WriteLocks(out, status);
   WriteVersion(out, status.version);
   WriteIndexes(out, status.indexes);
   if (!status.IsEven()) {
-    Continue(out);
-    out << "! not as many in each language: `appindex reindex` mends that\n";
+    WriteProblem(out, {"not as many in each language: a change is under way, or was broken off; "
+                       "`appindex reindex` mends that"});
   }
   return out.str();
 }

@@ -116,7 +116,10 @@ class CommandTest(unittest.TestCase):
     def test_usage(self):
         for arguments in (["lint"], ["lint", "--explain", "no-such-tag"],
                           ["lint", "--explain", "wrong-type", "."], ["lint", "--list-tags", "."],
+                          ["lint", "--explain", ""], ["lint", "--explain", "", "."],
+                          ["lint", "--explain", "wrong-type", "--list-tags"],
                           ["lint", "--format", "xml", "."], ["lint", "--unknown", "."],
+                          ["--json", "lint", "--format", "github", "."],
                           ["show"], ["show", "--lang", "eng", "."]):
             with self.subTest(arguments):
                 result = self.run_in(SCRATCH, *arguments)
@@ -129,10 +132,64 @@ class CommandTest(unittest.TestCase):
             result = self.run_in(SCRATCH, command, "nothing")
             self.assert_ends(result, FAILED)
             self.assertIn("nothing: No such file or directory", result.stderr)
-        os.mkfifo(SCRATCH / "index.conf")
-        result = self.run_in(SCRATCH, "lint", "index.conf")
+            self.assertIn("; see whether the path is right", result.stderr)
+        self.package(CLEAN)
+        (SCRATCH / "pkg/ui/index.conf").unlink()
+        os.mkfifo(SCRATCH / "pkg/ui/index.conf")
+        result = self.run_in(SCRATCH, "show", "pkg")
         self.assert_ends(result, FAILED)
-        self.assertIn("index.conf: ", result.stderr)
+        self.assertEqual(result.stderr, "appindex: pkg/ui/index.conf: cannot be read: not a "
+                                        "regular file; put a regular file in its place\n")
+        result = self.run_in(SCRATCH, "lint", "pkg", "--package", "nothing")
+        self.assert_ends(result, FAILED)
+        self.assertIn("nothing: there is no such directory; ", result.stderr)
+
+    def test_descriptor_that_cannot_be_read_is_a_finding_among_others(self):
+        packages = SCRATCH / "var/packages"
+        for name in ("Fifo", "Long", "Wrong"):
+            (packages / name).mkdir(parents=True)
+        os.mkfifo(packages / "Fifo/index.conf")
+        with open(packages / "Long/index.conf", "wb") as file:
+            file.truncate(17 << 20)
+        (packages / "Wrong/index.conf").write_text(json.dumps(CLEAN | {"app": 1}), encoding="utf-8")
+        result = self.run_in(SCRATCH, "--json", "lint", "var/packages")
+        self.assert_ends(result, FINDINGS)
+        found = {(finding["file"], finding["tag"], finding["message"], finding["line"],
+                  finding["pointer"]) for finding in json.loads(result.stdout)["findings"]}
+        self.assertEqual(found, {
+            ("var/packages/Fifo/index.conf", "descriptor-unreadable",
+             "cannot be read: not a regular file", 1, ""),
+            ("var/packages/Long/index.conf", "descriptor-unreadable",
+             "cannot be read: longer than 16 MiB", 1, ""),
+            ("var/packages/Wrong/index.conf", "wrong-type", '"app" must be a text, not a number',
+             1, "/app")})
+
+    def test_texts_of_two_string_sets_are_told_apart(self):
+        package = self.package([CLEAN | {"app": name, "stringset": name, "title": "app:title"}
+                                for name in ("one", "two")])
+        for name, text in (("one", "One"), ("two", "")):
+            texts = package / "ui" / name / "enu/strings"
+            texts.parent.mkdir(parents=True)
+            texts.write_text(f'[app]\ntitle="{text}"\nother="o"\n', encoding="utf-8")
+        tables = json.loads(self.run_in(package, "--json", "lint", ".").stdout)["texts"]
+        states = {table["root"]: table["references"]["app:title"]["enu"] for table in tables}
+        self.assertEqual(states, {"ui/one/": "present", "ui/two/": "empty"})
+        self.assertEqual({table["file"] for table in tables}, {"ui/index.conf"})
+
+    def test_output_that_cannot_be_written_is_a_failure(self):
+        with open("/dev/full", "wb") as full:
+            result = subprocess.run([APPINDEX, "lint", "--list-tags"], stdout=full,
+                                    stderr=subprocess.PIPE, text=True, check=False)
+        self.assertEqual(result.returncode, FAILED)
+        self.assertEqual(result.stderr, "appindex: standard output cannot be written: No space "
+                                        "left on device; direct it to another place\n")
+
+    def test_options_of_all_commands_may_stand_behind_them(self):
+        result = self.run_in("/", "lint", "/var/packages/PhotoAlbum", "--root", str(EXAMPLES),
+                             "--json")
+        self.assert_ends(result, DONE)
+        self.assertEqual(json.loads(result.stdout)["checked"],
+                         ["/var/packages/PhotoAlbum/target/ui/index.conf"])
 
     def test_lint_in_a_device_root(self):
         result = self.run_in("/", "--root", str(EXAMPLES), "--json", "lint",
@@ -172,6 +229,39 @@ class CommandTest(unittest.TestCase):
         self.assert_ends(result, DONE)
         self.assertIn("  enu  title  ", result.stdout)
         self.assertNotIn("Left out", result.stdout)
+
+    def test_show_takes_one_language_at_a_time(self):
+        package = self.package(CLEAN)
+        for arguments in (["--lang", "enu", package, "--model", "M"],
+                          ["--lang", "enu", "--lang", "ger", package],
+                          [package, "--lang", "enu"]):
+            with self.subTest(arguments):
+                result = self.run_in(SCRATCH, "--json", "show", *arguments)
+                self.assert_ends(result, DONE)
+                langs = [made["lang"] for made in
+                         json.loads(result.stdout)["descriptors"][0]["documents"]]
+                self.assertEqual(langs, [lang for lang in arguments if lang in ("enu", "ger")])
+
+    def test_show_says_what_adding_would_end_in(self):
+        package = self.package(CLEAN | {"app": 7})
+        result = self.run_in(SCRATCH, "show", "--platform", "p", "--model", "m", package)
+        self.assert_ends(result, FAILED)
+        self.assertTrue(result.stderr.endswith("` says where (code 120)\n"), result.stderr)
+        self.assertEqual(result.stderr.count("appindex lint"), 1, result.stderr)
+        result = self.run_in(SCRATCH, "--json", "show", package)
+        self.assertEqual(json.loads(result.stdout)["error"]["code"], 120)
+
+    def test_show_names_what_gives_nothing(self):
+        package = self.package([CLEAN | {"modules": {"a": {"params": "p", "title": "t",
+                                                          "enable": {}}, "b": 7}},
+                                "text", CLEAN | {"app": "B", "modules": [[]]}])
+        result = self.run_in(SCRATCH, "show", "--model", "m", "--platform", "p", package)
+        self.assert_ends(result, DONE)
+        self.assertEqual(result.stdout.partition("Left out on this device:\n")[2],
+                         "  /0/modules/b: gives nothing: not an object\n"
+                         "  /1: gives nothing: not an object\n"
+                         "  /2/modules/0: gives nothing: not an object\n"
+                         '  Example.App?p: "enable" lists no model and no platform\n')
 
     def test_show_says_what_to_do_when_the_device_has_no_name(self):
         (SCRATCH / "root/etc").mkdir(parents=True)

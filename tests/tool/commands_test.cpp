@@ -94,7 +94,8 @@ TEST_F(Commands, UnreachableDaemonEndsWith4) {
 TEST_F(Commands, WrongPathsAreNamed) {
   MakeDirs("/var/packages/Empty/ui");
   WriteFile("/var/packages/Photos/index.txt", "{}");
-  EXPECT_THAT(Failure({"add", "/var/packages/Gone/index.conf"}, 1), HasSubstr("no such file"));
+  WriteFile("/etc/index.conf", "{}");
+  EXPECT_THAT(Failure({"add", "/var/packages/Gone/index.conf"}, 1), HasSubstr("No such file"));
   EXPECT_THAT(Failure({"add", "/var/packages/Empty"}, 1),
               AllOf(HasSubstr("/var/packages/Empty: "), HasSubstr("no index.conf")));
   EXPECT_THAT(Failure({"del", "/var/packages/Photos/index.txt"}, 1),
@@ -137,6 +138,25 @@ TEST_F(Commands, WrongUsageEndsWith2) {
                                              {"search", "--lang", "xyz", "photo"}}) {
     EXPECT_THAT(Failure(arguments, 2), StartsWith("appindex: "));
   }
+}
+
+TEST_F(Commands, OptionsOfAllCommandsMayStandBehindThem) {
+  const Finished queued = Run({"enqueue", "add", "/var/packages/Photos", "--json", "-q"});
+  EXPECT_EQ(queued.status, 0) << queued.err;
+  EXPECT_EQ(Parse(queued.out)["requests"][0]["path"].asString(), ConfOf("Photos"));
+  EXPECT_EQ(queued.err, "");
+  EXPECT_TRUE(Parse(Run({"status", "--json"}).out)["daemon"]["reachable"].asBool());
+  EXPECT_EQ(Parse(Run({"lint", "/var/packages/Photos", "--json"}).out)["checked"].size(), 1U);
+  EXPECT_EQ(Run({"lint", "/var/packages/Photos", "-q"}).err, "");
+}
+
+TEST_F(Commands, NamesOfCommandsAreWordsOfAQueryToo) {
+  ASSERT_EQ(Run({"reindex"}).status, 0);
+  EXPECT_EQ(Data({"search", "status"})["query"].asString(), "status");
+  EXPECT_EQ(Data({"search", "--lang", "ger", "add"})["query"].asString(), "add");
+  EXPECT_EQ(Data({"search", "photo", "status", "reindex"})["query"].asString(),
+            "photo status reindex");
+  EXPECT_FALSE(Exists(kQueue));
 }
 
 TEST_F(Commands, HelpNamesEveryExitCode) {

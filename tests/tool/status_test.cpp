@@ -1,5 +1,8 @@
 // appindex status: what it tells of the daemon, the queue, the locks, the version and the indexes.
+#include <fcntl.h>
 #include <gmock/gmock.h>
+#include <sys/file.h>
+#include <sys/wait.h>
 #include <unistd.h>
 
 #include "tests/integration/real_device.h"
@@ -70,6 +73,19 @@ TEST_F(StatusCommand, RequestThatHoldsUpTheBatchIsNamed) {
   EXPECT_THAT(order[1]["problem"].asString(), HasSubstr("not as it must be"));
   EXPECT_THAT(order[2]["problem"].asString(), HasSubstr("cannot be read: No such file"));
   EXPECT_THAT(Text(), HasSubstr("! cannot be read: No such file"));
+}
+
+TEST_F(StatusCommand, HolderOfTheQueueIsNamedAlsoWhenItHasTheLockFromAnother) {
+  WriteFile(kQueue, "");
+  const Fd queue(open(kQueue, O_RDWR | O_CLOEXEC));
+  const pid_t taker = fork();  // as the program flock of a shell: it ends, the shell has the lock
+  if (taker == 0) _exit(flock(queue.Get(), LOCK_EX));
+  ASSERT_EQ(waitpid(taker, nullptr, 0), taker);
+  const Json::Value lock = Status()["locks"][1];
+  EXPECT_EQ(lock["path"].asString(), kQueue);
+  ASSERT_EQ(lock["holders"].size(), 1U);
+  EXPECT_EQ(lock["holders"][0]["pid"].asInt(), getpid());
+  EXPECT_THAT(Text(), HasSubstr("Locked          " + std::string(kQueue) + " by appindex_test"));
 }
 
 TEST_F(StatusCommand, HolderOfALockIsNamed) {

@@ -141,6 +141,25 @@ TEST_F(Terminal, SearchEmphasisesWhatMatches) {
   EXPECT_THAT(tool.Output(), HasSubstr("1. \033[1mFoto\033[0malbum"));
 }
 
+TEST_F(Terminal, SearchEmphasisesFormsAndWhatSlipsMean) {
+  Rebuild();
+  for (const char* typed : {"photos", "phtoo"}) {
+    ToolInTerminal tool(Here(), kUsual, {"search", "--lang", "enu", typed});
+    EXPECT_EQ(tool.Wait(), 0);
+    EXPECT_THAT(tool.Output(), HasSubstr("1. \033[1mPhoto\033[0m Album")) << typed;
+    EXPECT_THAT(tool.Output(), Not(HasSubstr("score"))) << "nobody asked for explanations";
+  }
+}
+
+TEST_F(Terminal, SearchEmphasisesWhatKeywordsWereFoundBy) {
+  InstallPackage("Mail", {{"enu", "Photo Post"}});
+  WriteFile(ConfOf("Mail"), R"({"app":"Mail","title":"app:title","keywords":["photos","pics"]})");
+  Rebuild();
+  ToolInTerminal tool(Here(), kUsual, {"search", "--lang", "enu", "photos"});
+  EXPECT_EQ(tool.Wait(), 0);
+  EXPECT_THAT(tool.Output(), HasSubstr("\033[1mPhoto\033[0m Post"));
+}
+
 TEST_F(Terminal, NoColorTakesTheEmphasisAndLeavesTheProgress) {
   Rebuild();
   const Environment no_color = {{"NO_COLOR", "1"}};

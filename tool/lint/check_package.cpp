@@ -10,13 +10,13 @@ namespace {
 
 constexpr char kNeverRead[] = "Docuvault";
 
-// The descriptor that a full rebuild takes here and now.
+// The one of several descriptors that a full rebuild takes here and now.
 std::string FirstDescriptor(const Package& package) {
-  std::string first;
+  std::string first = package.descriptors.front();
   try {
     velkor::appindex::FindIndexConfByAppRoot(first, package.dir, 0);
   } catch (const velkor::Error&) {
-    first.clear();  // a directory cannot be opened
+    // A directory cannot be opened here: it may be any of them.
   }
   return first;
 }

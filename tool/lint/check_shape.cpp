@@ -105,7 +105,9 @@ void CheckWeight(Report& report, const Node& weight, const char* name) {
     ReportType(report, weight, Quoted(name), "a whole number from 1 to 5");
     return;
   }
-  if (value.asDouble() < kLeastWeight) {
+  if (!value.isInt()) {
+    report.Add("weight-range", weight, "a weight of more than 31 bits counts as 1");
+  } else if (value.asDouble() < kLeastWeight) {
     report.Add("weight-range", weight, "a weight below 1 leaves the keyword out");
   } else if (value.asDouble() > kMostWeight) {
     report.Add("weight-range", weight, "a weight above 5 has no more effect than 5");

@@ -3,6 +3,7 @@
 #include <iterator>
 #include <set>
 #include <sstream>
+#include <utility>
 
 #include "appindex/device_identity.h"
 #include "appindex/utilities/file_utils.h"
@@ -198,19 +199,21 @@ bool TextRow::HasGaps() const {
   });
 }
 
-std::vector<TextRow> CheckTexts(Report& report, const Package& package,
-                                const ParsedDescriptor& descriptor, TextsCache& cache) {
-  std::vector<TextRow> rows;
+std::vector<TextTable> CheckTexts(Report& report, const Package& package,
+                                  const ParsedDescriptor& descriptor, TextsCache& cache) {
+  std::vector<TextTable> tables;
   for (const RootUse& root : CollectReferences(package, descriptor)) {
     const Texts& texts = cache.Of(root.root);
+    TextTable table{descriptor.file, root.root, {}};
     for (const TextUse& use : root.uses) {
-      rows.push_back(MakeRow(texts, use.text));
-      ReportRow(report, texts, use, rows.back());
+      table.rows.push_back(MakeRow(texts, use.text));
+      ReportRow(report, texts, use, table.rows.back());
     }
+    tables.push_back(std::move(table));
     ReportSections(report, texts, root);
     ReportLanguages(report, texts, root);
   }
-  return rows;
+  return tables;
 }
 
 }  // namespace tool::lint

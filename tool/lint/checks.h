@@ -9,6 +9,7 @@
 #include <string>
 #include <vector>
 
+#include "appindex/string_pool.h"
 #include "tool/lint/package.h"
 #include "tool/lint/report.h"
 #include "tool/lint/texts.h"
@@ -62,14 +63,25 @@ struct TextRow {
   bool HasGaps() const;
 };
 
-// The texts that the descriptor refers to, language by language. Returns a row for each reference,
-// in the order of the descriptor.
-std::vector<TextRow> CheckTexts(Report& report, const Package& package,
-                                const ParsedDescriptor& descriptor, TextsCache& cache);
+// The texts of one descriptor that come from one directory of texts.
+struct TextTable {
+  std::string file;
+  std::string root;           // that directory; ends in "/"
+  std::vector<TextRow> rows;  // one for each reference, in the order of the descriptor
+};
+
+// The texts that the descriptor refers to, language by language: a table for each directory of
+// texts that its entries use.
+std::vector<TextTable> CheckTexts(Report& report, const Package& package,
+                                  const ParsedDescriptor& descriptor, TextsCache& cache);
 
 // Keywords that add nothing to the title.
 void CheckKeywords(Report& report, const Package& package, const ParsedDescriptor& descriptor,
                    TextsCache& cache);
+
+// Documents that the search daemon refuses, which makes adding the package fail.
+void CheckDocuments(Report& report, const Package& package, const ParsedDescriptor& descriptor,
+                    velkor::appindex::StringPool& pool);
 
 // Where the package keeps its descriptors.
 void CheckPackage(std::vector<Finding>& findings, const Package& package);

@@ -2,17 +2,18 @@
 
 #include <algorithm>
 #include <cerrno>
-#include <cstring>
 #include <list>
 #include <set>
-#include <stdexcept>
 #include <tuple>
 
 #include "appindex/utilities/json_helpers.h"
 #include "common/file_io.h"
+#include "tool/failure.h"
 
 namespace tool::lint {
 namespace {
+
+constexpr char kKnownShape[] = R"(let it be {"models": [...], "platforms": [...]})";
 
 class Linter {
  public:
@@ -36,10 +37,12 @@ class Linter {
   void CheckDescriptor(const Package& package, const std::string& file) {
     if (!seen_.insert(file).second) return;
     std::string text;
-    if (!velkor::ReadRegularFile(file, velkor::kMaxJsonFileBytes, text)) {
-      throw std::runtime_error(DisplayPath(file) + ": " + std::strerror(errno));
-    }
     outcome_.checked.push_back(file);
+    if (!velkor::ReadRegularFile(file, velkor::kMaxJsonFileBytes, text)) {
+      outcome_.findings.push_back(
+          FileFinding("descriptor-unreadable", file, "cannot be read: " + WhyNotRead(errno)));
+      return;
+    }
     descriptors_.push_back({file, SourceText(std::move(text)), Json::Value()});
     ParsedDescriptor& descriptor = descriptors_.back();
     if (const std::optional<SyntaxError> error = ParseJson(descriptor.source, descriptor.root)) {
@@ -63,15 +66,18 @@ class Linter {
     CheckFilters(report, descriptor.root, options_.known);
     ids_.Check(report, descriptor.file, descriptor.root);
     CheckTextsRoot(report, package, descriptor);
-    TextTable table{descriptor.file, CheckTexts(report, package, descriptor, texts_)};
-    if (!table.rows.empty()) outcome_.tables.push_back(std::move(table));
+    for (TextTable& table : CheckTexts(report, package, descriptor, texts_)) {
+      outcome_.tables.push_back(std::move(table));
+    }
     CheckKeywords(report, package, descriptor, texts_);
+    CheckDocuments(report, package, descriptor, pool_);
   }
 
   const Options& options_;
   std::set<std::string> seen_;
   IdRegistry ids_;
   TextsCache texts_;
+  velkor::appindex::StringPool pool_;
   std::list<ParsedDescriptor> descriptors_;  // ids_ points into them
   Outcome outcome_;
 };
@@ -86,7 +92,7 @@ std::optional<std::set<std::string>> ReadNames(const std::string& path, const Js
     if (all_texts) names.insert(name.asString());
   }
   if (!all_texts) {
-    throw std::runtime_error(path + ": \"" + member + "\" must be a list of names");
+    throw Failure(path + ": \"" + member + "\" is not a list of names", kKnownShape);
   }
   return names;
 }
@@ -104,17 +110,19 @@ Outcome Lint(const std::vector<std::string>& paths, const Options& options) {
 KnownNames ReadKnownNames(const std::string& path) {
   std::string text;
   if (!velkor::ReadRegularFile(path, velkor::kMaxJsonFileBytes, text)) {
-    throw std::runtime_error(path + ": " + std::strerror(errno));
+    const int read_error = errno;
+    throw Failure(path + ": cannot be read: " + WhyNotRead(read_error), AdviceOn(read_error));
   }
   const SourceText source(std::move(text));
   Json::Value root;
   if (const std::optional<SyntaxError> error = ParseJson(source, root)) {
     const Position at = source.At(error->offset);
-    throw std::runtime_error(path + ":" + std::to_string(at.line) + ":" +
-                             std::to_string(at.column) + ": " + error->message);
+    throw Failure(path + ":" + std::to_string(at.line) + ":" + std::to_string(at.column) + ": " +
+                      error->message,
+                  kKnownShape);
   }
   if (!root.isObject()) {
-    throw std::runtime_error(path + ": must be an object with \"models\" and \"platforms\"");
+    throw Failure(path + ": not an object", kKnownShape);
   }
   return {ReadNames(path, root, "models"), ReadNames(path, root, "platforms")};
 }

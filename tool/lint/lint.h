@@ -13,24 +13,18 @@ struct Options {
   std::string package_dir;  // where the package begins; empty: found out
 };
 
-// The texts of one descriptor, language by language.
-struct TextTable {
-  std::string file;
-  std::vector<TextRow> rows;
-};
-
 struct Outcome {
   std::vector<std::string> checked;  // the descriptors, in order
   std::vector<Finding> findings;     // in the order of files and places
   std::vector<TextTable> tables;     // of the descriptors that refer to texts
 };
 
-// Checks every descriptor that the paths name. Throws std::runtime_error, naming the file, for what
-// cannot be read.
+// Checks every descriptor that the paths name. Throws Failure for a path that cannot be
+// read; what of its descriptors cannot be read is a finding.
 Outcome Lint(const std::vector<std::string>& paths, const Options& options);
 
-// Reads {"models": [...], "platforms": [...]}, either of which may be left out. Throws
-// std::runtime_error, naming the file, when it is not that.
+// Reads {"models": [...], "platforms": [...]}, either of which may be left out. Throws Failure when
+// it is not that.
 KnownNames ReadKnownNames(const std::string& path);
 
 }  // namespace tool::lint

@@ -69,6 +69,7 @@ Json::Value ToJson(const Finding& finding) {
 Json::Value ToJson(const TextTable& table) {
   Json::Value json(Json::objectValue);
   json["file"] = DisplayPath(table.file);
+  json["root"] = DisplayPath(table.root);
   json["references"] = Json::Value(Json::objectValue);
   for (const TextRow& row : table.rows) {
     Json::Value& states = json["references"][row.reference];
@@ -94,8 +95,9 @@ Counts Count(const std::vector<Finding>& findings) {
 void WriteText(std::ostream& out, const Outcome& outcome, bool emphasise) {
   for (const Finding& finding : outcome.findings) {
     const Look look = finding.severity == Severity::kNote ? Look::kFaint : Look::kBold;
-    out << Place(finding) << ": " << Styled(SeverityName(finding.severity), look, emphasise) << ": "
-        << finding.message << " [" << finding.tag << "]\n";
+    out << OneLine(Place(finding)) << ": "
+        << Styled(SeverityName(finding.severity), look, emphasise) << ": "
+        << OneLine(finding.message) << " [" << finding.tag << "]\n";
   }
 }
 

@@ -5,13 +5,14 @@
 #include <cstring>
 #include <filesystem>
 #include <optional>
-#include <stdexcept>
 
 #include "appindex/error.h"
 #include "appindex/index_mgr_internal.h"
 #include "appindex/string_pool_internal.h"
 #include "appindex/utilities/file_utils.h"
 #include "common/dir_reader.h"
+#include "common/searched_dirs.h"
+#include "tool/failure.h"
 
 namespace tool::lint {
 namespace {
@@ -29,15 +30,24 @@ constexpr int kReach = 5;
 // How much deeper to look for what was meant to be found.
 constexpr int kFurther = 6;
 
+[[noreturn]] void FailOfPath(const std::string& path, int error) {
+  throw Failure(path + ": " + std::strerror(error), AdviceOn(error));
+}
+
 std::string Absolute(const std::string& path) {
   std::string absolute = fs::absolute(path).lexically_normal().string();
   while (absolute.size() > 1 && absolute.back() == '/') absolute.pop_back();
   return absolute;
 }
 
+// Links can lead to one file by countless ways: more of them say nothing new.
+constexpr std::size_t kMostFound = 100;
+
 struct Found {
   std::vector<std::string> near;
   std::vector<std::string> deep;
+  velkor::SearchedDirs searched;
+  std::size_t Count() const { return near.size() + deep.size(); }
 };
 
 struct Search {
@@ -53,9 +63,10 @@ bool IsLink(const std::string& path) {
 // Looks for all that the library's search would stop at. Beyond its reach links are not followed.
 void FindAll(Found& found, const Search& search, const std::string& dir, int depth) {
   velkor::DirReader reader(dir);
-  if (!reader.IsOpen()) return;
+  if (!reader.IsOpen() || found.searched.Has(reader, depth)) return;
+  const std::size_t before = found.Count();
   std::string name;
-  while (reader.Next(name)) {
+  while (found.Count() < kMostFound && reader.Next(name)) {
     const std::string child = dir + name + (search.directories ? "/" : "");
     const bool is_dir = velkor::IsDirExist(child, true);
     if (name == search.name && (is_dir || !search.directories)) {
@@ -64,6 +75,7 @@ void FindAll(Found& found, const Search& search, const std::string& dir, int dep
       FindAll(found, search, search.directories ? child : child + "/", depth + 1);
     }
   }
+  if (found.Count() == before) found.searched.Add(reader, depth);
 }
 
 Found FindAllSorted(const Search& search, const std::string& dir) {
@@ -128,7 +140,8 @@ Package PackageOf(const std::string& path, bool is_dir, const std::string& packa
   if (!package_dir.empty()) {
     const std::string dir = Absolute(package_dir) + "/";
     if (!velkor::IsDirExist(dir, true)) {
-      throw std::runtime_error(package_dir + ": there is no such directory");
+      throw Failure(package_dir + ": there is no such directory",
+                    "let --package name the one that the package begins with");
     }
     return MakePackage(dir, false);
   }
@@ -145,7 +158,7 @@ Package PackageOf(const std::string& path, bool is_dir, const std::string& packa
 // as others.
 void AppendInstalled(std::vector<Package>& packages, const std::string& dir, bool is_built_in) {
   velkor::DirReader reader(dir);
-  if (!reader.IsOpen()) throw std::runtime_error(DisplayPath(dir) + ": " + std::strerror(errno));
+  if (!reader.IsOpen()) FailOfPath(DisplayPath(dir), errno);
   std::vector<std::string> names;
   std::string name;
   while (reader.Next(name)) names.push_back(name);
@@ -191,11 +204,9 @@ std::vector<Package> FindPackages(const std::string& path, const std::string& pa
   const std::string absolute = Absolute(path);
   std::error_code error;
   const fs::file_status status = fs::status(absolute, error);
-  if (!fs::exists(status)) throw std::runtime_error(path + ": " + std::strerror(ENOENT));
+  if (!fs::exists(status)) FailOfPath(path, error ? error.value() : ENOENT);
   const bool is_dir = fs::is_directory(status);
-  if (is_dir && !velkor::DirReader(absolute).IsOpen()) {
-    throw std::runtime_error(path + ": " + std::strerror(errno));
-  }
+  if (is_dir && !velkor::DirReader(absolute).IsOpen()) FailOfPath(path, errno);
   std::vector<Package> packages;
   if (is_dir && package_dir.empty() && AppendTree(packages, absolute)) return packages;
   Package package = PackageOf(absolute, is_dir, package_dir);

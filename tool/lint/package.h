@@ -27,7 +27,7 @@ struct Package {
 
 // The packages that a path names: a descriptor, a package's directory or a part of it, or the
 // directory that packages are installed in, or a whole device tree. `package_dir`, unless empty,
-// says where the package begins. Throws std::runtime_error for a path that cannot be read.
+// says where the package begins. Throws Failure for a path that cannot be read.
 std::vector<Package> FindPackages(const std::string& path, const std::string& package_dir);
 
 // The directory, ending in "/", of the texts that an entry's texts come from: the one that its

@@ -25,10 +25,7 @@ void AppendEntry(std::vector<Item>& items, const Node& entry) {
   if (!entry.value->isObject()) return;
   items.push_back({entry, entry, false});
   if (!entry.Has("modules")) return;
-  const Node modules = entry.Member("modules");
-  if (!modules.value->isArray()) return;
-  for (Json::ArrayIndex i = 0; i < modules.value->size(); ++i) {
-    const Node module = modules.Element(i);
+  for (const Node& module : ElementsOf(entry.Member("modules"))) {
     if (module.value->isObject()) items.push_back({module, entry, true});
   }
 }
@@ -55,6 +52,18 @@ Node Node::Element(Json::ArrayIndex index) const {
   return {&(*value)[index], pointer + "/" + std::to_string(index)};
 }
 
+std::vector<Node> ElementsOf(const Node& node) {
+  std::vector<Node> elements;
+  if (node.value->isArray()) {
+    for (Json::ArrayIndex i = 0; i < node.value->size(); ++i) elements.push_back(node.Element(i));
+  } else if (node.value->isObject()) {
+    for (const std::string& name : node.value->getMemberNames()) {
+      elements.push_back(node.Member(name));
+    }
+  }
+  return elements;
+}
+
 void Report::Add(const char* tag, const Node& at, std::string message,
                  std::vector<std::string> languages) {
   const auto offset = static_cast<std::size_t>(at.value->getOffsetStart());
@@ -63,7 +72,9 @@ void Report::Add(const char* tag, const Node& at, std::string message,
 }
 
 Finding FileFinding(const char* tag, const std::string& file, std::string message) {
-  return {tag, FindTag(tag)->severity, file, {}, "", std::move(message), {}};
+  const bool is_dir = !file.empty() && file.back() == '/';
+  const Position place = is_dir ? Position{} : Position{1, 1};
+  return {tag, FindTag(tag)->severity, file, place, "", std::move(message), {}};
 }
 
 std::vector<Item> ItemsOf(const Json::Value& root) {

@@ -25,6 +25,9 @@ struct Node {
   bool Has(const std::string& name) const { return value->isObject() && value->isMember(name); }
 };
 
+// What the library takes for the elements of a list: those of a list, and the members of an object.
+std::vector<Node> ElementsOf(const Node& node);
+
 // A descriptor that parses. Where its values stand is looked up in the text.
 struct ParsedDescriptor {
   std::string file;  // absolute
@@ -47,7 +50,8 @@ class Report {
   std::vector<Finding>& findings_;
 };
 
-// A finding about a file as a whole.
+// A finding about a file as a whole, which stands at its beginning, or about a directory, whose
+// path ends in "/" and which has no places.
 Finding FileFinding(const char* tag, const std::string& file, std::string message);
 
 // The items of a descriptor: each entry, and behind it its modules. What is no object is left out.

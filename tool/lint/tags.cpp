@@ -45,7 +45,8 @@ const std::vector<Tag> kDescriptorTags = {
      "\"stringset\" from their entry and cannot set them."},
     {"weight-range", kWarning, true, "A weight that has no effect.",
      "A weight says how often a keyword counts, from 1 to 5. Below 1 the keyword\n"
-     "is left out; above 5 it counts as 5."},
+     "is left out; above 5 it counts as 5. A number of more than 31 bits, below 0 or\n"
+     "above, is taken for none at all: the keyword counts once."},
     {"description-missing", kWarning, false, "An item has no description.",
      "A hit shows the title and below it the description, which is searched too.\n"
      "Without \"desc\" the line stays empty. Describe the item in a sentence."},
@@ -54,6 +55,18 @@ const std::vector<Tag> kDescriptorTags = {
      "The index holds one document for an id: the item that is written last\n"
      "replaces the other. Items that no device shows together, because of their\n"
      "filters, may share an id. Ids are compared among all descriptors of one run."},
+    {"nul-character", kError, false, "A text holds the character NUL.",
+     "The search daemon refuses a document with such a text (code 603). Adding the\n"
+     "package then fails as a whole, and keeps all requests waiting that are queued\n"
+     "with it. Remove the character: a descriptor writes it \\u0000; in a file of\n"
+     "texts it stands as a byte."},
+    {"text-too-long", kError, false, "A text is longer than the index takes.",
+     "An id has at most 4096 bytes, any other text of a document 1 MiB, and all of\n"
+     "them fit into a message of 16 MiB. Keywords count in the language and in\n"
+     "English, as often as their weights say, with the English title before them.\n"
+     "A byte that is not UTF-8 counts as three. The search daemon refuses what is\n"
+     "longer. Adding the package then fails as a whole, and keeps all requests\n"
+     "waiting that are queued with it. Shorten the text."},
     {"keyword-repeats-title", kWarning, false, "A keyword is the same as the title.",
      "The title is searched anyway, and the English title is put among the\n"
      "keywords of every language. The keyword adds nothing: remove it, or use a\n"
@@ -139,6 +152,10 @@ const std::vector<Tag> kPackageTags = {
     {"descriptor-name", kError, false, "The file is not named index.conf.",
      "The library ignores a path whose last part is not exactly index.conf, in\n"
      "lower case. Rename the file."},
+    {"descriptor-unreadable", kError, false, "The descriptor cannot be read.",
+     "It is not a regular file, is longer than 16 MiB, or its permissions or the disk\n"
+     "forbid it. The library takes it for one that is not JSON: it is logged and\n"
+     "gives nothing to be found. Nothing else is known of it here."},
     {"package-docuvault", kError, false, "The package has a name that is left out.",
      "A full rebuild leaves out the directory named Docuvault. Its items are found\n"
      "after they were added, and gone after the next rebuild. Name the package\n"

@@ -49,7 +49,7 @@ void WriteHead(std::ostream& out) {
 }
 
 void WriteRow(std::ostream& out, const TextRow& row) {
-  out << Fitted(row.reference);
+  out << Fitted(OneLine(row.reference));
   for (const std::string& lang : velkor::appindex::GetSupportedLangs()) {
     out << ' ' << Mark(row, lang);
   }
@@ -65,7 +65,8 @@ void WriteTables(std::ostream& out, const Outcome& outcome) {
     for (const TextRow& row : table.rows) {
       if (!row.HasGaps()) continue;
       if (!has_head) {
-        out << "\nTexts of " << DisplayPath(table.file) << "\n";
+        out << "\nTexts of " << OneLine(DisplayPath(table.file)) << " in "
+            << OneLine(DisplayPath(table.root)) << "\n";
         WriteHead(out);
       }
       has_head = any = true;

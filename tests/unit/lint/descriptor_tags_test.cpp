@@ -115,6 +115,20 @@ TEST_F(LintTest, WeightRange) {
                           Is("weight-range", "/keywords/5/weight")));
 }
 
+TEST_F(LintTest, WeightRangeSaysWhatTheWeightCounts) {
+  std::vector<std::string> messages;
+  for (const Finding& finding : FindWith(R"({"app": "A", "title": "t", "keywords": [
+           {"text": "a", "weight": 0}, {"text": "b", "weight": 6}, {"text": "c", "weight": 2147483647},
+           {"text": "d", "weight": 2147483648}, {"text": "e", "weight": -10000000000}]})",
+                                         "weight-range")) {
+    messages.push_back(finding.message);
+  }
+  const std::string none = "a weight of more than 31 bits counts as 1";
+  EXPECT_THAT(messages, ElementsAre("a weight below 1 leaves the keyword out",
+                                    "a weight above 5 has no more effect than 5",
+                                    "a weight above 5 has no more effect than 5", none, none));
+}
+
 TEST_F(LintTest, DescriptionMissing) {
   EXPECT_THAT(FindWith(R"({"app": "A", "title": "t", "modules": [
                            {"params": "p", "title": "m", "desc": ""},

@@ -1,4 +1,7 @@
 // The findings about where a package keeps its descriptor.
+#include <sys/stat.h>
+#include <unistd.h>
+
 #include "tests/unit/lint/lint_test.h"
 
 namespace tool::lint {
@@ -26,6 +29,27 @@ TEST_F(LintTest, DescriptorSecondIsTheOneThatIsNotMetFirst) {
   ASSERT_THAT(found, ElementsAre(Is("descriptor-second", "")));
   const std::string other = found[0].file == one ? two : one;
   EXPECT_THAT(found[0].message, HasSubstr(other));
+}
+
+TEST_F(LintTest, DescriptorSecondIsToldOfOneWhenTheFirstIsNotKnown) {
+  const std::string one =
+      dir_.Write("two/a/index.conf", R"({"app": "A", "title": "T", "desc": "d"})");
+  const std::string two =
+      dir_.Write("two/b/index.conf", R"({"app": "B", "title": "T", "desc": "d"})");
+  // Whatever order the file system has, some of these are met first.
+  const std::vector<std::string> closed = {"two/0", "two/m", "two/zz"};
+  for (const std::string& name : closed) {
+    dir_.Write(name + "/file", "");
+    ASSERT_EQ(chmod((dir_ / name).c_str(), 0), 0);
+  }
+  ASSERT_EQ(chmod(dir_.Path().c_str(), 0755), 0);
+  const uid_t user = geteuid();
+  ASSERT_EQ(seteuid(user == 0 ? 65534 : user), 0);  // root may open them
+  const auto found = FindIn(dir_ / "two", "descriptor-second");
+  ASSERT_EQ(seteuid(user), 0);
+  for (const std::string& name : closed) chmod((dir_ / name).c_str(), 0755);
+  ASSERT_THAT(found, ElementsAre(Is("descriptor-second", "")));
+  EXPECT_THAT(found[0].message, HasSubstr(found[0].file == one ? two : one));
 }
 
 TEST_F(LintTest, DescriptorBeyondReach) {

@@ -97,6 +97,19 @@ TEST(Package, NoLinkIsFollowedForeverBeyondTheReach) {
   EXPECT_THAT(FindPackages(dir.Path(), "")[0].deep_texts, IsEmpty());
 }
 
+TEST(Package, LinksThatLeadRoundAndRoundComeToAnEnd) {
+  const TempDir dir;
+  dir.Write("empty/file", "");
+  dir.Write("full/index.conf", "{}");
+  for (int i = 0; i < 60; ++i) {
+    const std::string link = "/link" + std::to_string(i);
+    ASSERT_EQ(symlink((dir / "empty").c_str(), (dir / ("empty" + link)).c_str()), 0);
+    ASSERT_EQ(symlink((dir / "full").c_str(), (dir / ("full" + link)).c_str()), 0);
+  }
+  EXPECT_THAT(FindPackages(dir / "empty", "")[0].descriptors, IsEmpty());
+  EXPECT_THAT(FindPackages(dir / "full", "")[0].descriptors, ::testing::SizeIs(100));
+}
+
 TEST(Package, PathThatCannotBeReadIsRefused) {
   const TempDir dir;
   EXPECT_THROW(FindPackages(dir / "nothing", ""), std::runtime_error);

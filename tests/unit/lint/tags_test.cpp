@@ -30,7 +30,8 @@ TEST(Tags, PublishedOnesAreThere) {
                            "text-untranslated",    "language-absent",   "language-unknown",
                            "texts-not-found",      "texts-ambiguous",   "texts-beyond-reach",
                            "descriptor-missing",   "descriptor-second", "descriptor-beyond-reach",
-                           "descriptor-name",      "package-docuvault", "package-unknown"}) {
+                           "descriptor-name",      "package-docuvault", "package-unknown",
+                           "nul-character",        "text-too-long",     "descriptor-unreadable"}) {
     EXPECT_NE(FindTag(name), nullptr) << name;
   }
 }

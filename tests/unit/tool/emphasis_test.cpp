@@ -9,8 +9,9 @@ namespace tool {
 namespace {
 
 // With brackets in place of the control sequences.
-std::string Marked(const std::string& text, const std::string& query) {
-  std::string marked = Emphasised(text, query);
+std::string Marked(const std::string& text, const std::string& query,
+                   Likeness likeness = Likeness::kSame) {
+  std::string marked = Emphasised(text, {{query, likeness}});
   for (const auto& [sequence, mark] : {std::pair<std::string, std::string>("\033[1m", "["),
                                        std::pair<std::string, std::string>("\033[0m", "]")}) {
     for (std::size_t at = 0; (at = marked.find(sequence)) != std::string::npos;) {
@@ -46,6 +47,23 @@ TEST(Emphasised, NothingFoundLeavesTheText) {
   EXPECT_EQ(Marked("Photo Album", "mail"), "Photo Album");
   EXPECT_EQ(Marked("Photo Album", ""), "Photo Album");
   EXPECT_EQ(Marked("", "mail"), "");
+}
+
+TEST(Emphasised, OtherFormsOfAWordWhereTheyWereFound) {
+  EXPECT_EQ(Marked("Photo Album", "photos"), "Photo Album");
+  EXPECT_EQ(Marked("Photo Album", "photos", Likeness::kForm), "[Photo] Album");
+  EXPECT_EQ(Marked("Activity Log, Active Users", "activities", Likeness::kForm),
+            "[Activity] Log, Active Users");
+  EXPECT_EQ(Marked("Alte Häuser", "haus", Likeness::kForm), "Alte [Häus]er") << "it is there";
+  EXPECT_EQ(Marked("Altes Haus", "häuser", Likeness::kForm), "Altes [Haus]");
+  EXPECT_EQ(Marked("Mail Server", "photos", Likeness::kForm), "Mail Server");
+}
+
+TEST(Emphasised, WordsThatAreMeantBySlips) {
+  EXPECT_EQ(Marked("Photo Album", "phtoo"), "Photo Album");
+  EXPECT_EQ(Marked("Photo Album", "phtoo", Likeness::kSlip), "[Photo] Album");
+  EXPECT_EQ(Marked("Réglages système", "sisteme", Likeness::kSlip), "Réglages [système]");
+  EXPECT_EQ(Marked("Photo Album", "calendar", Likeness::kSlip), "Photo Album");
 }
 
 TEST(Emphasised, WordsThatOverlapAreMarkedOnce) {

@@ -4,10 +4,17 @@
 #include <fcntl.h>
 #include <gmock/gmock.h>
 #include <sys/file.h>
+#include <sys/socket.h>
+#include <sys/stat.h>
 #include <sys/sysmacros.h>
+#include <sys/wait.h>
 #include <unistd.h>
 
 #include <cstdlib>
+#include <cstring>
+#include <fstream>
+#include <iterator>
+#include <string>
 
 #include "common/unique_fd.h"
 
@@ -45,6 +52,85 @@ TEST(LockHolders, NamesTheProcess) {
   ASSERT_EQ(holders.size(), 1U);
   EXPECT_EQ(holders[0].pid, getpid());
   EXPECT_EQ(holders[0].program, "tool_test");
+}
+
+TEST(WaitersIn, FindsThoseWhoWait) {
+  EXPECT_THAT(WaitersIn(kLocks, makedev(8, 1), 77), ElementsAre(13));
+  EXPECT_THAT(WaitersIn(kLocks, makedev(8, 1), 78), IsEmpty());
+}
+
+// A lock that a process has taken which has ended since, as the program flock of a shell.
+class HeldByAnHeir : public ::testing::Test {
+ protected:
+  HeldByAnHeir() {
+    const pid_t taker = fork();
+    if (taker == 0) _exit(flock(file_.Get(), LOCK_EX));
+    waitpid(taker, nullptr, 0);
+    taker_ = taker;
+  }
+  ~HeldByAnHeir() override { unlink(path_); }
+
+  char path_[32] = "/tmp/lock-holders-XXXXXX";
+  velkor::UniqueFd file_{mkostemp(path_, O_CLOEXEC)};
+  velkor::UniqueFd proc_{open("/proc", O_RDONLY | O_DIRECTORY | O_CLOEXEC)};
+  pid_t taker_ = 0;
+};
+
+TEST_F(HeldByAnHeir, TheOneThatHasTheFileOpenIsNamed) {
+  const std::vector<LockHolder> holders = LockHolders(proc_.Get(), path_);
+  ASSERT_EQ(holders.size(), 1U);
+  EXPECT_EQ(holders[0].pid, getpid());
+  EXPECT_EQ(holders[0].program, "tool_test");
+  EXPECT_FALSE(holders[0].has_ended);
+}
+
+TEST_F(HeldByAnHeir, TheOneThatWaitsIsNot) {
+  const pid_t waiter = fork();
+  if (waiter == 0) {
+    const int own = open(path_, O_RDONLY | O_CLOEXEC);
+    file_.Close();
+    _exit(flock(own, LOCK_EX));
+  }
+  struct stat file {};
+  ASSERT_EQ(fstat(file_.Get(), &file), 0);
+  std::string locks;
+  do {
+    std::ifstream stream("/proc/locks");
+    locks.assign(std::istreambuf_iterator<char>(stream), std::istreambuf_iterator<char>());
+  } while (WaitersIn(locks, file.st_dev, file.st_ino).empty());
+  const std::vector<LockHolder> holders = LockHolders(proc_.Get(), path_);
+  file_.Close();
+  waitpid(waiter, nullptr, 0);
+  ASSERT_EQ(holders.size(), 1U);
+  EXPECT_EQ(holders[0].pid, getpid());
+}
+
+TEST_F(HeldByAnHeir, WithoutOneToBeSeenTheTakerIsSaidToHaveEnded) {
+  // Open nowhere but on its way through a socket.
+  int ends[2];
+  ASSERT_EQ(socketpair(AF_UNIX, SOCK_DGRAM | SOCK_CLOEXEC, 0, ends), 0);
+  const velkor::UniqueFd sender(ends[0]);
+  const velkor::UniqueFd receiver(ends[1]);
+  char byte = 0;
+  iovec data = {&byte, 1};
+  alignas(cmsghdr) char control[CMSG_SPACE(sizeof(int))] = {};
+  msghdr message{};
+  message.msg_iov = &data;
+  message.msg_iovlen = 1;
+  message.msg_control = control;
+  message.msg_controllen = sizeof(control);
+  cmsghdr* header = CMSG_FIRSTHDR(&message);
+  header->cmsg_level = SOL_SOCKET;
+  header->cmsg_type = SCM_RIGHTS;
+  header->cmsg_len = CMSG_LEN(sizeof(int));
+  const int fd = file_.Get();
+  std::memcpy(CMSG_DATA(header), &fd, sizeof(fd));
+  ASSERT_EQ(sendmsg(sender.Get(), &message, 0), 1);
+  file_.Close();
+  const std::vector<LockHolder> holders = LockHolders(proc_.Get(), path_);
+  ASSERT_EQ(holders.size(), 1U);
+  EXPECT_EQ(holders[0].pid, taker_);
+  EXPECT_TRUE(holders[0].has_ended);
 }
 
 TEST(LockHolders, WithoutFileOrListThereAreNone) {

@@ -28,6 +28,17 @@ TEST(Output, ShortenedCutsBetweenCharacters) {
   EXPECT_EQ(Shortened("", 0), "");
 }
 
+TEST(Output, OneLineHasNoControlCharacters) {
+  EXPECT_EQ(OneLine("Überblick 写真"), "Überblick 写真");
+  EXPECT_EQ(OneLine("a\nb\r\x1B[2Jc\x7F"), "a b  [2Jc ");
+  EXPECT_EQ(OneLine("a\xC2\x9B"
+                    "b\xC2\xA0"
+                    "c"),
+            "a b\xC2\xA0"
+            "c");
+  EXPECT_EQ(OneLine("torn \xC2"), "torn \xC2");
+}
+
 TEST(Output, CountedTakesThePlural) {
   EXPECT_EQ(Counted(0, "request"), "0 requests");
   EXPECT_EQ(Counted(1, "request"), "1 request");

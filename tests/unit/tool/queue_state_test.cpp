@@ -42,6 +42,7 @@ TEST_F(QueueStateTest, AgeIsThatOfTheLastLine) {
   const utimbuf hour_ago = {0, std::time(nullptr) - 3600};
   ASSERT_EQ(utime(kQueue, &hour_ago), 0);
   EXPECT_GE(ReadRequestFile(kQueue).age, 3600);
+  EXPECT_EQ(ReadRequestFile(kQueue).written, hour_ago.modtime);
   const utimbuf later = {0, std::time(nullptr) + 3600};
   ASSERT_EQ(utime(kQueue, &later), 0);
   EXPECT_EQ(ReadRequestFile(kQueue).age, 0);
@@ -64,7 +65,7 @@ TEST_F(QueueStateTest, OrderIsBatchThenQueueEachByPath) {
   std::vector<std::string> steps;
   for (const Step& step : Order(batch, queue)) {
     steps.push_back(std::string(step.from == &batch ? "batch " : "queue ") +
-                    NameOfOperation(step.op) + " " + step.path + " " + step.problem);
+                    NameOfOperation(step.op) + " " + step.path + " " + step.problem.line);
   }
   EXPECT_THAT(steps, testing::ElementsAre("batch add " + ConfOf("App") + " ", "queue reindex  ",
                                           "queue add " + ConfOf("Gone") +
