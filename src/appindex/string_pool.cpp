@@ -2,7 +2,7 @@
 
 #include <cxxabi.h>
 
-#include <boost/regex.hpp>
+#include <vector>
 
 #include "appindex/device_identity.h"
 #include "appindex/error.h"
@@ -12,6 +12,7 @@
 #include "appindex/utils_internal.h"
 #include "common/check.h"
 #include "common/dir_reader.h"
+#include "common/pattern.h"
 #include "common/searched_dirs.h"
 #include "device/tovo_webui.h"
 
@@ -40,13 +41,12 @@ void FillSections(Sections& sections, const Json::Value& strings) {
 }
 
 std::string PackageTextsRoot(const std::string& conf_path) {
-  static const boost::regex reg("^(/var/packages/[^/]*)");
-  boost::smatch sm;
-  if (!boost::regex_search(conf_path, sm, reg)) {
+  std::vector<std::string> package;
+  if (!SearchPattern("^(/var/packages/[^/]*)", conf_path, package)) {
     throw Error(Error::kGeneralError, "Malformed conf path: " + conf_path);
   }
   std::string root;
-  if (!FindPkgTextRoot(root, sm[1] + "/", 0)) {
+  if (!FindPkgTextRoot(root, package[0] + "/", 0)) {
     throw Error(Error::kTextsRootError, "Cannot find text root: " + conf_path);
   }
   return root;

@@ -1,9 +1,10 @@
-#include <boost/regex.hpp>
 #include <utility>
+#include <vector>
 
 #include "appindex/device_identity.h"
 #include "appindex/utils_internal.h"
 #include "common/check.h"
+#include "common/pattern.h"
 #include "device/tovo_config.h"
 
 namespace velkor::appindex {
@@ -42,13 +43,12 @@ void PrepareModelAndPlatform() {
                Error::kGeneralError, [] { return "Failed to get unique"; });
 
   const std::string unique = buf;
-  static const boost::regex reg("marovant_([^_]*)_(.*)");
-  boost::smatch sm;
-  CheckOrThrow(boost::regex_search(unique, sm, reg), {kModule, 42, "PrepareModelAndPlatform"},
-               "!boost::regex_search(unique, sm, reg)", Error::kGeneralError,
-               [&unique] { return "Malformed hb unique: " + unique; });
-  platform = sm[1];
-  model = sm[2];
+  std::vector<std::string> names;
+  CheckOrThrow(SearchPattern("marovant_([^_]*)_(.*)", unique, names),
+               {kModule, 42, "PrepareModelAndPlatform"}, "!boost::regex_search(unique, sm, reg)",
+               Error::kGeneralError, [&unique] { return "Malformed hb unique: " + unique; });
+  platform = names[0];
+  model = names[1];
 }
 
 AssumedDevice::AssumedDevice(std::optional<std::string> model_name,
