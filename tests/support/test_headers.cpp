@@ -1,0 +1,2 @@
+// What the headers of every test are compiled for, see tests/CMakeLists.txt.
+int main() {}
