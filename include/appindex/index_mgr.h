@@ -22,9 +22,10 @@ namespace velkor::appindex {
 //
 // Does nothing when the last component of `conf_path` is not "index.conf". A descriptor that cannot
 // be read or parsed is logged and gives no documents; it is not an error. A keyword of the wrong
-// shape is logged and left out. When the daemon reports that an index is missing (601), the call
-// becomes a full Reindex, and throws what that throws; only a daemon that goes on losing indexes
-// while they are rebuilt makes it give up and throw 601.
+// shape is logged and left out, and so, unlogged, are those behind 16 MiB of keywords, more than
+// any daemon takes. When the daemon reports that an index is missing (601), the call becomes a full
+// Reindex, and throws what that throws; only a daemon that goes on losing indexes while they are
+// rebuilt makes it give up and throw 601.
 //
 // Throws Error 502 when the descriptor filters by device and the device's unique string is
 // unreadable, Error 120 when an item's id is not a string, and lets the JSON library's own
