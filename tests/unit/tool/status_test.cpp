@@ -7,9 +7,9 @@
 #include <ctime>
 
 #include "appindex/utilities/json_helpers.h"
-#include "tests/support/device_root_test.h"
 #include "tests/support/indexing.h"
 #include "tests/support/scripted_daemon.h"
+#include "tests/unit/tool/status_test_device.h"
 
 namespace tool {
 namespace {
@@ -22,20 +22,9 @@ using ::testing::HasSubstr;
 using ::testing::Not;
 
 constexpr char kNoText[] = R"({"app":["no text"],"title":"Broken"})";
-constexpr int kNoProc = -1;
 
-class StatusTest : public test::DeviceRootTest {
+class StatusTest : public StatusTestDevice {
  protected:
-  static Json::Value Data() {
-    Status status;
-    Gather(status, kNoProc);
-    return ToJson(status);
-  }
-  static std::string Text() {
-    Status status;
-    Gather(status, kNoProc);
-    return ToText(status);
-  }
   static void Age(const char* path, std::time_t seconds) {
     const utimbuf then = {0, std::time(nullptr) - seconds};
     ASSERT_EQ(utime(path, &then), 0);

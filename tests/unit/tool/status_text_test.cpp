@@ -4,10 +4,9 @@
 
 #include <sstream>
 
-#include "tests/support/device_root_test.h"
 #include "tests/support/indexing.h"
 #include "tests/support/scripted_daemon.h"
-#include "tool/status.h"
+#include "tests/unit/tool/status_test_device.h"
 
 namespace tool {
 namespace {
@@ -17,21 +16,8 @@ using ::testing::HasSubstr;
 using ::testing::Not;
 
 constexpr std::size_t kColumns = 80;
-constexpr int kNoProc = -1;
 
-class StatusTextTest : public test::DeviceRootTest {
- protected:
-  static Json::Value Data() {
-    Status status;
-    Gather(status, kNoProc);
-    return ToJson(status);
-  }
-  static std::string Text() {
-    Status status;
-    Gather(status, kNoProc);
-    return ToText(status);
-  }
-};
+class StatusTextTest : public StatusTestDevice {};
 
 TEST_F(StatusTextTest, ProblemsStayWithinTheColumns) {
   const std::string word(200, 'x');
