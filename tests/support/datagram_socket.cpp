@@ -8,6 +8,8 @@
 #include <stdexcept>
 #include <utility>
 
+#include "tests/support/fork_guard.h"
+
 namespace test {
 
 DatagramSocket::DatagramSocket(const std::string& path)
@@ -30,6 +32,7 @@ void DatagramSocket::Read() {
   for (;;) {
     const ssize_t size = recv(fd_.Get(), buffer.data(), buffer.size(), 0);
     if (size <= 0) return;
+    const ForkGuard guard = HoldForks();
     const std::lock_guard lock(mutex_);
     datagrams_.emplace_back(buffer.data(), static_cast<std::size_t>(size));
     arrived_.notify_all();

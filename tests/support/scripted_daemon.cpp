@@ -16,6 +16,7 @@
 #include <utility>
 
 #include "host/framing.h"
+#include "tests/support/fork_guard.h"
 
 namespace test {
 namespace {
@@ -120,11 +121,13 @@ void ScriptedDaemon::Handle(int fd) {
 
   std::string text;
   if (!host::RecvFrame(fd, text)) return;
+  ForkGuard guard = HoldForks();
   const Json::Value request = Parse(text);
   {
     const std::lock_guard<std::mutex> lock(mutex_);
     requests_.push_back(request);
   }
+  guard.unlock();  // what follows may wait for a process that the test starts
   if (react_) reaction = react_(request);
   if (reaction.kind == Reaction::kReply) host::SendFrame(fd, reaction.text);
   if (reaction.kind == Reaction::kRawBytes) SendRaw(fd, reaction.text);

@@ -11,6 +11,8 @@
 #include <stdexcept>
 #include <utility>
 
+#include "tests/support/fork_guard.h"
+
 namespace test {
 namespace {
 
@@ -48,6 +50,7 @@ SystemLog::SystemLog(const std::string& path)
 void SystemLog::Start() {
   path_ = "/dev/log";
   reader_ = std::thread([this] { Read(); });
+  Take();  // a fork from now on finds it begun
 }
 
 SystemLog::~SystemLog() {
@@ -63,9 +66,12 @@ SystemLog::~SystemLog() {
 }
 
 void SystemLog::Read() {
+  ForkGuard guard = HoldForks();
   std::string buffer(kMaxDatagram, '\0');
   for (;;) {
+    guard.unlock();
     const ssize_t size = recv(fd_, buffer.data(), buffer.size(), 0);
+    guard.lock();
     if (size < 0) {
       if (errno == EINTR) continue;
       return;
