@@ -1,4 +1,5 @@
-// All of the library's utilities.
+/// @file
+/// All of the library's utilities.
 #pragma once
 
 #include "appindex/utilities/credentials.h"
