@@ -49,7 +49,7 @@ void Connection::Receive() {
   while (state_ == State::kReceiving) {
     const ssize_t n = recv(Fd(), step.data(), step.size(), MSG_DONTWAIT);
     if (n < 0 && errno == EINTR) continue;
-    if (n < 0 && (errno == EAGAIN || errno == EWOULDBLOCK)) return;
+    if (n < 0 && errno == EAGAIN) return;
     if (n <= 0) {
       state_ = State::kDone;
       return;
@@ -75,7 +75,7 @@ void Connection::Send() {
     const ssize_t n =
         send(Fd(), bytes_.data() + sent_, bytes_.size() - sent_, MSG_NOSIGNAL | MSG_DONTWAIT);
     if (n < 0 && errno == EINTR) continue;
-    if (n < 0 && (errno == EAGAIN || errno == EWOULDBLOCK)) return;
+    if (n < 0 && errno == EAGAIN) return;
     if (n < 0) break;
     sent_ += static_cast<std::size_t>(n);
   }

@@ -45,11 +45,10 @@ Server::Server(Handler& handler, int listener, int signals, milliseconds time_li
       events_(epoll_create1(EPOLL_CLOEXEC)),
       wake_(eventfd(0, EFD_CLOEXEC | EFD_NONBLOCK)),
       time_limit_(time_limit) {
-  if (!events_.IsOpen() || !wake_.IsOpen()) {
+  if (!events_.IsOpen() || !wake_.IsOpen() || !Watch(wake_.Get(), EPOLLIN) ||
+      !Watch(signals_.Get(), EPOLLIN)) {
     throw std::runtime_error(WithErrno("cannot wait for clients", errno));
   }
-  Watch(wake_.Get(), EPOLLIN);
-  Watch(signals_.Get(), EPOLLIN);
 }
 
 void Server::Run(unsigned workers) {
@@ -208,8 +207,7 @@ std::shared_ptr<Connection> Server::Accept() {
   const int fd = accept4(listener_.Get(), nullptr, nullptr, SOCK_CLOEXEC | SOCK_NONBLOCK);
   if (fd < 0) {
     if (errno == EMFILE || errno == ENFILE || errno == ENOBUFS || errno == ENOMEM) {
-      syslog(LOG_WARNING, "%s", WithErrno("cannot accept a client", errno).c_str());
-      accept_again_ = Clock::now() + kAcceptPause;
+      PauseAccepting("cannot accept a client");
     }
     return nullptr;
   }
@@ -223,7 +221,14 @@ std::shared_ptr<Connection> Server::Accept() {
   return Continue(std::move(connection));
 }
 
-// Sees to it that a connection goes on from the state that it is in.
+// For a system that has nothing left to give, of which errno tells.
+void Server::PauseAccepting(const char* what) {
+  syslog(LOG_WARNING, "%s", WithErrno(what, errno).c_str());
+  accept_again_ = Clock::now() + kAcceptPause;
+}
+
+// Sees to it that a connection goes on from the state that it is in; one that cannot be waited for
+// is closed.
 std::shared_ptr<Connection> Server::Continue(std::shared_ptr<Connection> connection) {
   if (connection->GetState() == State::kTooLong) {
     connection->Reply(handler_.TooLong(), Clock::now() + time_limit_);
@@ -231,8 +236,11 @@ std::shared_ptr<Connection> Server::Continue(std::shared_ptr<Connection> connect
   if (connection->GetState() == State::kReceived) return connection;
   if (connection->GetState() == State::kDone) return nullptr;
   const int fd = connection->Fd();
-  Watch(fd, connection->GetState() == State::kSending ? EPOLLOUT : EPOLLIN);
-  connections_[fd] = std::move(connection);
+  if (Watch(fd, connection->GetState() == State::kSending ? EPOLLOUT : EPOLLIN)) {
+    connections_[fd] = std::move(connection);
+  } else {
+    syslog(LOG_ERR, "%s", WithErrno("cannot wait for a client", errno).c_str());
+  }
   return nullptr;
 }
 
@@ -263,20 +271,20 @@ void Server::UpdateListening() {
   const bool listen = connections_.size() < kMaxConnections && Clock::now() >= accept_again_;
   if (listen == listening_) return;
   listening_ = listen;
-  if (listen) {
-    Watch(listener_.Get(), EPOLLIN);
-  } else {
+  if (!listen) {
     Unwatch(listener_.Get());
+  } else if (!Watch(listener_.Get(), EPOLLIN)) {
+    PauseAccepting("cannot wait for clients");
+    listening_ = false;
   }
 }
 
-void Server::Watch(int fd, unsigned events) {
+// False, with errno set, when the system has no room for it.
+bool Server::Watch(int fd, unsigned events) {
   epoll_event event{};
   event.events = events;
   event.data.fd = fd;
-  if (epoll_ctl(events_.Get(), EPOLL_CTL_ADD, fd, &event) != 0) {
-    syslog(LOG_ERR, "%s", WithErrno("cannot wait for a client", errno).c_str());
-  }
+  return epoll_ctl(events_.Get(), EPOLL_CTL_ADD, fd, &event) == 0;
 }
 
 void Server::Unwatch(int fd) { epoll_ctl(events_.Get(), EPOLL_CTL_DEL, fd, nullptr); }

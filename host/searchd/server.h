@@ -61,7 +61,8 @@ class Server {
   void TakeBack();
   void DropExpired();
   void UpdateListening();
-  void Watch(int fd, unsigned events);
+  void PauseAccepting(const char* what);
+  bool Watch(int fd, unsigned events);
   void Unwatch(int fd);
 
   Handler& handler_;
@@ -74,7 +75,7 @@ class Server {
   // The waiting thread's own.
   std::map<int, std::shared_ptr<Connection>> connections_;
   bool listening_ = false;
-  TimePoint accept_again_;                // set after the system had no descriptor to give
+  TimePoint accept_again_;                // set after the system had nothing to give
   TimePoint stop_by_ = TimePoint::max();  // the stop signal sets it
   bool stopped_ = false;
   bool reopen_ = false;

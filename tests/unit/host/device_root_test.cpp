@@ -3,6 +3,8 @@
 #include <gmock/gmock.h>
 #include <unistd.h>
 
+#include <cerrno>
+#include <cstring>
 #include <filesystem>
 #include <future>
 #include <stdexcept>
@@ -10,12 +12,14 @@
 #include <thread>
 
 #include "tests/unit/host/child.h"
+#include "tests/unit/host/faults.h"
 #include "tests/unit/host/temp_dir.h"
 
 namespace {
 
 using testing::AllOf;
 using testing::HasSubstr;
+using testing::Not;
 
 std::string ErrorOfEntering(const std::string& dir) {
   try {
@@ -128,6 +132,31 @@ TEST(DeviceRootTest, AnOrdinaryUserWithASecondThreadIsToldWhy) {
     thread.join();
     EXPECT_THAT(error, AllOf(HasSubstr(root.Path()), HasSubstr("unshare"), HasSubstr("thread")));
   });
+}
+
+TEST(DeviceRootTest, AnOrdinaryUserIsToldWhichStepTheSystemRefuses) {
+  struct Refused {
+    Fault Faults::*call;
+    int spared;
+    const char* step;
+  };
+  const TempDir root;
+  if (IsRoot()) {
+    ASSERT_EQ(chown(root.Path().c_str(), kOrdinaryId, kOrdinaryId), 0);
+  }
+  for (const Refused& refused : {Refused{&Faults::unshare, 0, "unshare"},
+                                 Refused{&Faults::open, 0, "open /proc/self/setgroups"},
+                                 Refused{&Faults::write, 1, "write /proc/self/uid_map"},
+                                 Refused{&Faults::chdir, 0, "chdir"}}) {
+    RunInChild([&] {
+      BecomeOrdinaryUser();
+      SkipChildUnlessARootMayBeEntered();
+      (faults.*refused.call).Arm(EPERM, refused.spared);
+      EXPECT_THAT(ErrorOfEntering(root.Path()),
+                  AllOf(HasSubstr(root.Path()), HasSubstr(refused.step),
+                        HasSubstr(std::strerror(EPERM)), Not(HasSubstr("thread"))));
+    });
+  }
 }
 
 }  // namespace

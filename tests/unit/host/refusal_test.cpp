@@ -39,6 +39,20 @@ TEST_F(RefusalTest, AReadThatFailsIsAFailure) {
   EXPECT_EQ(errno, EIO);
 }
 
+TEST_F(RefusalTest, AFileThatCannotBeOpenedIsAFailure) {
+  const std::string file = dir_.Write("file", "content");
+  faults.open.Arm(EMFILE);
+  EXPECT_EQ(ReadRegularFile(file, 100), std::nullopt);
+  EXPECT_EQ(errno, EMFILE);
+}
+
+// The system's own files tell no size before they are read.
+TEST_F(RefusalTest, AFileThatHoldsMoreThanItsSizeIsHeldToTheLimitToo) {
+  ASSERT_TRUE(ReadRegularFile("/proc/self/status", 100000).has_value());
+  EXPECT_EQ(ReadRegularFile("/proc/self/status", 10), std::nullopt);
+  EXPECT_EQ(errno, EFBIG);
+}
+
 TEST_F(RefusalTest, ANameThatHoldsNulIsNoFile) {
   const std::string file = dir_.Write("file", "content");
   EXPECT_EQ(ReadRegularFile(file + std::string("\0.conf", 6), 100), std::nullopt);
@@ -132,9 +146,29 @@ TEST_F(ConnectRefusalTest, AWaitThatEndsInAFailureIsOne) {
   ExpectFailure(ENOMEM);
 }
 
+TEST_F(ConnectRefusalTest, ASocketThatCannotBeMadeToWaitIsAFailure) {
+  faults.fcntl.Arm(EINVAL);  // with room at once
+  ExpectFailure(EINVAL);
+  faults.connect.Arm(EAGAIN);
+  faults.fcntl.Arm(EINVAL);  // when there is none yet
+  ExpectFailure(EINVAL);
+}
+
 TEST_F(ConnectRefusalTest, NoRoomWithinTheTimeIsATimeOut) {
   faults.connect.Arm(EAGAIN, 0, 2);
   ExpectFailure(ETIMEDOUT);
+}
+
+TEST_F(ConnectRefusalTest, ADaemonThatEndsWhileItIsWaitedForIsAFailure) {
+  faults.connect.ArmEach({EAGAIN, ECONNREFUSED});
+  ExpectFailure(ECONNREFUSED);
+}
+
+TEST_F(ConnectRefusalTest, AWaitThatIsInterruptedWhenItsTimeIsOverIsATimeOut) {
+  faults.connect.ArmEach({EAGAIN, EINTR});
+  tovodaemon::DomainSockConnection connection(path_);
+  EXPECT_FALSE(connection.Connect(0));
+  EXPECT_EQ(errno, ETIMEDOUT);
 }
 
 }  // namespace

@@ -82,7 +82,8 @@ TEST_F(FileGetKeyValueTest, ABackslashEscapesInDoubleQuotesOnly) {
 }
 
 TEST_F(FileGetKeyValueTest, LinesThatAreNotWellFormedAreSkipped) {
-  EXPECT_EQ(ReadFrom("key=\"good\"\nkey=\"open\nkey\nkey=\"a\"b\nkey=\"\\\"\n=\"x\"\n", "key"),
+  EXPECT_EQ(ReadFrom("key=\"good\"\n\nkey=\"open\nkey\nkey=\"a\"b\nkey=\"\\\"\nkey=\"\\\n=\"x\"\n",
+                     "key"),
             "good");
 }
 

@@ -269,28 +269,48 @@ TEST_P(FileTransferTest, DropsSetIdBitsWhereTheOwnerCannotBeKept) {
   EXPECT_EQ(after.st_mode & 07777U, 0755U);
 }
 
-TEST_P(FileTransferTest, AFullDiskLeavesEverythingAsItWas) {
+// Each step up to the one by which the copy takes its place.
+TEST_P(FileTransferTest, AStepThatFailsLeavesEverythingAsItWas) {
   const std::string source = WriteSource();
   dir_.Write("target", "before");
+  const auto expect_failure = [&](Fault& step, int error, int spared = 0) {
+    CrossFileSystems();
+    step.Arm(error, spared);
+    ExpectFailureWithoutTrace(source, error);
+  };
+  expect_failure(faults.open, EMFILE);
+  expect_failure(faults.open, EMFILE, 1);  // of the target's directory
+  expect_failure(faults.mkostemp, ENFILE);
+  expect_failure(faults.read, EIO);
+  expect_failure(faults.write, ENOSPC);
+  expect_failure(faults.fchown, EROFS);
   CrossFileSystems();
-  faults.write.Arm(ENOSPC);
-  ExpectFailureWithoutTrace(source, ENOSPC);
+  faults.fchown.ArmEach({EPERM, EIO});  // the owner, and then the group alone
+  ExpectFailureWithoutTrace(source, EIO);
+  expect_failure(faults.fchmod, EIO);
+  expect_failure(faults.futimens, EIO);
+  expect_failure(faults.fsync, EIO);
 }
 
-TEST_P(FileTransferTest, AnInterruptedWriteGoesOn) {
+TEST_P(FileTransferTest, AFileThatCannotBeGivenAwayIsCopiedWithoutItsSetIdBits) {
+  for (const int error : {EPERM, EINVAL}) {  // not allowed, or there is no such user in this root
+    const std::string source = WriteSource();
+    ASSERT_EQ(chmod(source.c_str(), 06755), 0);
+    CrossFileSystems();
+    faults.fchown.Arm(error, 0, 2);
+    ASSERT_EQ(Ask(GetParam(), source, dir_ / "target"), 0);
+    EXPECT_EQ(ReadFile(dir_ / "target"), "content");
+    EXPECT_EQ(StatOf(dir_ / "target").st_mode & 07777U, 0755U);
+  }
+}
+
+TEST_P(FileTransferTest, InterruptedCallsGoOn) {
   const std::string source = WriteSource();
   CrossFileSystems();
+  faults.read.Arm(EINTR);
   faults.write.Arm(EINTR);
   EXPECT_EQ(Ask(GetParam(), source, dir_ / "target"), 0);
   EXPECT_EQ(ReadFile(dir_ / "target"), "content");
-}
-
-TEST_P(FileTransferTest, ContentThatCannotBeMadeDurableLeavesEverythingAsItWas) {
-  const std::string source = WriteSource();
-  dir_.Write("target", "before");
-  CrossFileSystems();
-  faults.fsync.Arm(EIO);
-  ExpectFailureWithoutTrace(source, EIO);
 }
 
 TEST_P(FileTransferTest, ADirectoryThatCannotBeMadeDurableKeepsTheSource) {

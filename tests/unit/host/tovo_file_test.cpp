@@ -135,4 +135,15 @@ TEST(DirIsMntPointFallbackTest, TheRootDirectoryIsItsOwnParentAndCounts) {
   EXPECT_GT(TOVOFSDirIsMntPoint("/"), 0);
 }
 
+TEST(DirIsMntPointFallbackTest, ADirectoryThatCannotBeComparedIsAFailure) {
+  const FaultScope scope;
+  const TempDir dir;
+  for (const int spared : {0, 1}) {  // itself, and what is above it
+    faults.statx_knows_mounts = false;
+    faults.stat.Arm(EACCES, spared);
+    EXPECT_LT(TOVOFSDirIsMntPoint(dir.Path().c_str()), 0);
+    EXPECT_EQ(TLIBCErrGet(), EACCES);
+  }
+}
+
 }  // namespace

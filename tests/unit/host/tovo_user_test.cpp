@@ -186,6 +186,48 @@ TEST_F(UserTest, SettingsThatCannotBeReadAreAFailure) {
   RunInRoot(root_, [] { EXPECT_LT(TOVOServiceUserHomeIsEnabled("alice"), 0); });
 }
 
+TEST_F(UserTest, AMemberOfVeryManyGroupsIsAnAdministratorToo) {
+  std::string groups;
+  for (int i = 0; i < 100; ++i) {
+    groups += "group" + std::to_string(i) + ":x:" + std::to_string(62000 + i) + ":alice\n";
+  }
+  root_.Write("etc/group", groups + "administrators:x:61101:alice\n");
+  RunInRoot(root_, [] { EXPECT_EQ(TLIBGroupIsAdminGroupMem("alice", 0), 1); });
+}
+
+TEST_F(UserTest, AnInterruptedLookUpIsTakenUpAgain) {
+  RunInRoot(root_, [] {
+    faults.getpwnam_r.Arm(EINTR);
+    TOVOUSER* user = nullptr;
+    EXPECT_GE(TOVOUserGet("alice", &user), 0);
+    ExpectUser(user, "alice", kAliceUid, 61200);
+    TOVOUserFree(user);
+  });
+}
+
+// ERANGE: as for an entry that no buffer can hold.
+TEST_F(UserTest, ALookUpThatFailsIsNoUnknownUser) {
+  RunInRoot(root_, [] {
+    for (const int error : {EIO, EMFILE, ERANGE}) {
+      faults.getpwnam_r.Arm(error, 0, 100);
+      TOVOUSER* user = nullptr;
+      EXPECT_LT(TOVOUserGet("alice", &user), 0);
+      EXPECT_EQ(TLIBCErrGet(), error);
+      EXPECT_EQ(user, nullptr);
+      EXPECT_FALSE(ResetCredentialsByName("alice", true));
+      EXPECT_EQ(TLIBCErrGet(), error);
+    }
+  });
+}
+
+TEST_F(UserTest, WhoIsAnAdministratorCannotBeToldWithoutTheGroups) {
+  RunInRoot(root_, [] {
+    faults.getgrnam_r.Arm(EIO);
+    EXPECT_LT(TLIBGroupIsAdminGroupMem("Velkor", 0), 0);
+    EXPECT_EQ(TLIBCErrGet(), EIO);
+  });
+}
+
 // The switches between several users.
 class CredentialsTest : public UserTest {
  protected:
@@ -253,29 +295,50 @@ TEST_F(CredentialsTest, AnUnknownUserChangesNothing) {
   });
 }
 
+// Every step that makes Velkor alice, by way of root.
 TEST_F(CredentialsTest, ASwitchThatFailsHalfWayIsUndone) {
   RunInRoot(root_, [] {
     ASSERT_TRUE(ResetCredentialsByName("Velkor", true));
     const Identity before;
-    faults.seteuid.Arm(EAGAIN, 1);  // the first call regains root, the second becomes alice
-    EXPECT_FALSE(ResetCredentialsByName("alice", true));
-    EXPECT_EQ(TLIBCErrGet(), EAGAIN);
-    EXPECT_TRUE(Identity() == before);
+    const auto expect_undone = [&](Fault& step, int spared) {
+      step.Arm(EAGAIN, spared);
+      EXPECT_FALSE(ResetCredentialsByName("alice", true));
+      EXPECT_EQ(TLIBCErrGet(), EAGAIN);
+      EXPECT_TRUE(Identity() == before);
+    };
+    expect_undone(faults.setgroups, 0);
+    expect_undone(faults.setegid, 0);
+    expect_undone(faults.seteuid, 1);  // the first call regains root
   });
 }
 
 TEST_F(CredentialsTest, ASwitchThatCannotBeUndoneEitherEndsTheProcess) {
   RunInRoot(root_, [] {
     ASSERT_TRUE(ResetCredentialsByName("Velkor", true));
-    const pid_t child = fork();
-    if (child == 0) {
-      faults.seteuid.Arm(EAGAIN, 1, 2);  // becomes neither alice nor Velkor again
-      ResetCredentialsByName("alice", true);
-      _exit(0);
-    }
-    int status = 0;
-    ASSERT_EQ(waitpid(child, &status, 0), child);
-    EXPECT_TRUE(WIFSIGNALED(status) && WTERMSIG(status) == SIGABRT) << status;
+    const auto expect_end = [&](Fault& step, int spared) {
+      const pid_t child = fork();
+      if (child == 0) {
+        faults.seteuid.Arm(EAGAIN, 1);  // does not become alice
+        step.Arm(EAGAIN, spared, 2);
+        ResetCredentialsByName("alice", true);
+        _exit(0);
+      }
+      int status = 0;
+      ASSERT_EQ(waitpid(child, &status, 0), child);
+      EXPECT_TRUE(WIFSIGNALED(status) && WTERMSIG(status) == SIGABRT) << status;
+    };
+    // Nor gets back Velkor's groups, group or user.
+    expect_end(faults.setgroups, 1);
+    expect_end(faults.setegid, 1);
+    expect_end(faults.seteuid, 1);
+  });
+}
+
+TEST_F(CredentialsTest, TheSavedUserIsAWayToRoot) {
+  RunInRoot(root_, [] {
+    ASSERT_EQ(setresuid(kAliceUid, kAliceUid, 0), 0);
+    EXPECT_TRUE(ResetCredentialsByName("Velkor", true));
+    EXPECT_EQ(geteuid(), kVelkorUid);
   });
 }
 

@@ -74,6 +74,13 @@ TEST(AnalyzerTest, FoldsWidthAndCompatibilityForms) {
   EXPECT_EQ(Raw(WordsOf("x_jpn", "ﾌｧｲﾙ")), Raw(WordsOf("x_jpn", "ファイル")));
 }
 
+// Letters that consist of no other one and a mark.
+TEST(AnalyzerTest, PutsWhatPeopleTypeForForeignLettersBeside) {
+  EXPECT_EQ(
+      Plain(WordsOf("x_enu", "ægir óðinn þór øre łódź cœur đak ħal ŧak ılık")),
+      (Strings{"aegir", "odinn", "thor", "ore", "lodz", "coeur", "dak", "hal", "tak", "ilik"}));
+}
+
 TEST(AnalyzerTest, PutsTheFormWithoutAccentsBeside) {
   const std::vector<Word> words = WordsOf("x_ger", "Größe Zürich");
   EXPECT_EQ(Raw(words), (Strings{"grösse", "zürich"}));

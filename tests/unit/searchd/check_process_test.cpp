@@ -73,5 +73,23 @@ TEST_F(UncheckedTest, AProcessThatCannotBeStartedIsReported) {
               HasSubstr("cannot check " + std::string(kPath) + ": " + std::strerror(EAGAIN)));
 }
 
+TEST_F(UncheckedTest, AnInterruptedWaitForTheResultGoesOn) {
+  CheckProcess process(STDERR_FILENO);
+  DatabaseCheck check(kPath, process, DatabaseCheck::Files::kFound);
+  failing_call = {"read", EINTR, 0};
+  EXPECT_EQ(FailureOf(check), "");
+  EXPECT_EQ(failing_call.name, "") << "it was not called";
+}
+
+// As when reading the database makes the process crash.
+TEST_F(UncheckedTest, ACheckThatEndsWithoutAResultHasFoundDamage) {
+  failing_call = {"write", EPIPE, 0};
+  CheckProcess process(STDERR_FILENO);
+  failing_call = {};
+  DatabaseCheck check(kPath, process, DatabaseCheck::Files::kFound);
+  EXPECT_THAT(FailureOf(check), HasSubstr(std::string(kPath) + " is damaged: the attempt"));
+  EXPECT_THAT(TakeLog(), ElementsAre(HasSubstr("an index cannot be used: " + std::string(kPath))));
+}
+
 }  // namespace
 }  // namespace searchd

@@ -4,7 +4,8 @@
 
 #include <string>
 
-// For a process of one thread. A process that is forked off goes on with a copy.
+// Set and looked at while only one thread runs; any may make the calls. A process that is forked
+// off goes on with a copy.
 struct FailingCall {
   std::string name;  // of the function; empty: none fails
   int error = 0;     // what errno is then

@@ -2,14 +2,20 @@
 
 #include <fcntl.h>
 #include <gtest/gtest.h>
+#include <sys/resource.h>
 #include <unistd.h>
 
 #include <atomic>
+#include <csignal>
 #include <filesystem>
 #include <functional>
 #include <string>
+#include <vector>
 
+#include "host/searchd/index_reader.h"
 #include "host/searchd/json_text.h"
+#include "host/searchd/language.h"
+#include "host/searchd/mapping.h"
 #include "host/searchd/request_error.h"
 #include "tests/support/device_root_test.h"
 
@@ -120,6 +126,109 @@ TEST_F(IndexTest, GivesUpUncommittedChangesToReplacedFilesAndSaysSoOnce) {
   EXPECT_EQ(index_->DocumentCount(), 2U);
 }
 
+TEST_F(IndexTest, SaysWithTheNextChangeWhatWasLostInAPause) {
+  Upsert("old");
+  index_->Commit();
+  fs::copy(kPath, kBackup);
+  Upsert("lost");
+  index_->ApplyChanges();
+  fs::remove_all(kPath);
+  fs::copy(kBackup, kPath);
+  ASSERT_TRUE(index_->HasWork());
+  index_->DoWork();
+  const RequestError failure = FailureOf([&] { Upsert("new"); });
+  EXPECT_EQ(failure.GetCode(), Code::kStorage);
+  EXPECT_NE(std::string(failure.what()).find("uncommitted changes were lost"), std::string::npos)
+      << failure.what();
+  Upsert("new");
+  index_->Commit();
+  EXPECT_EQ(index_->DocumentCount(), 2U);
+}
+
+// What is beyond the limit on a file's size fails as on a full disk.
+TEST_F(IndexTest, SaysWithTheNextChangeWhatAFullDiskHasLost) {
+  const auto expect_loss = [&](rlim_t most_bytes, const std::function<void()>& work) {
+    rlimit usual{};
+    ASSERT_EQ(getrlimit(RLIMIT_FSIZE, &usual), 0);
+    const rlimit full{most_bytes, usual.rlim_max};
+    ASSERT_EQ(setrlimit(RLIMIT_FSIZE, &full), 0);
+    work();
+    ASSERT_EQ(setrlimit(RLIMIT_FSIZE, &usual), 0);
+    const RequestError failure = FailureOf([&] { Upsert("new"); });
+    EXPECT_EQ(failure.GetCode(), Code::kStorage);
+    EXPECT_NE(
+        std::string(failure.what()).find("uncommitted changes were lost: " + std::string(kPath)),
+        std::string::npos)
+        << failure.what();
+  };
+  std::signal(SIGXFSZ, SIG_IGN);
+  Upsert("lost");
+  expect_loss(1, [&] { index_->ApplyChanges(); });  // making the first files
+  Upsert("old");
+  index_->Commit();
+  for (int i = 0; i < 1000; ++i) Upsert("lost" + std::to_string(i));
+  index_->ApplyChanges();
+  expect_loss(10000, [&] { index_->DoWork(); });  // writing to them
+  Upsert("new");
+  index_->Commit();
+  EXPECT_EQ(index_->DocumentCount(), 2U);
+}
+
+// Each commit may write over what only older states of the files need.
+TEST_F(IndexTest, ASearchThatCommitsHaveOvertakenStartsAgain) {
+  // Every time with other words, and enough of them for tables of many blocks.
+  const auto commit = [&](int time) {
+    for (int i = 0; i < 40; ++i) {
+      const std::string id = "id" + std::to_string(i);
+      std::string title = "time" + std::to_string(time);
+      for (int word = 0; word < 50; ++word)
+        title += " w" + std::to_string((i * 50 + word) * 7 + time);
+      index_->Upsert(id, ParseJson(R"({"id":")" + id + R"(","title":")" + title + "\"}"), 1000);
+    }
+    index_->Commit();
+  };
+  commit(0);
+  DatabaseCheck check(kPath, checks_, DatabaseCheck::Files::kFound);
+  const Mapping mapping = Mapping::Parse(index_->Definition().mappings);
+  IndexReader reader(kPath, mapping, LanguageOfIndex("appindex_enu"), check);
+  EXPECT_EQ(reader.DocumentCount(), 40U);
+  for (int time = 1; time <= 5; ++time) commit(time);
+  SearchRequest request;
+  request.query = "time5";
+  EXPECT_EQ(reader.Search(request).total, 40U);
+}
+
+TEST_F(IndexTest, TakesChangesAgainOnceItIsRestored) {
+  Upsert("old");
+  index_->Commit();
+  fs::copy(kPath, kBackup);
+  fs::resize_file(File("postlist.glass"), 100);
+  EXPECT_EQ(FailureOf([&] { index_->Commit(); }).GetCode(), Code::kStorage);
+  EXPECT_EQ(FailureOf([&] { Upsert("new"); }).GetCode(), Code::kStorage);
+  fs::remove_all(kPath);
+  fs::copy(kBackup, kPath);
+  Upsert("new");
+  index_->Commit();
+  EXPECT_EQ(index_->DocumentCount(), 2U);
+}
+
+// Another thread may have found it just before it was deleted.
+TEST_F(IndexTest, IsUnknownToWhoeverStillHoldsItOnceItIsClosed) {
+  Upsert("old");
+  index_->Commit();
+  EXPECT_EQ(index_->DocumentCount(), 1U);
+  Upsert("waiting");
+  index_->Close();
+  for (const std::function<void()>& use : std::vector<std::function<void()>>{
+           [&] { Upsert("new"); }, [&] { index_->Delete("old"); }, [&] { index_->Commit(); },
+           [&] { index_->DocumentCount(); }, [&] { index_->Search({}); }}) {
+    EXPECT_EQ(FailureOf(use).GetCode(), Code::kNoSuchIndex);
+  }
+  index_->Reopen();
+  index_->ApplyChanges();
+  EXPECT_FALSE(index_->HasWork());
+}
+
 TEST_F(IndexTest, NeverCommitsOverDamage) {
   for (const char* name : {"iamglass", "postlist.glass", "docdata.glass", "termlist.glass"}) {
     Upsert("old");
@@ -174,6 +283,7 @@ TEST_F(IndexTest, LosesNothingWhileAnotherProcessHoldsIt) {
   {
     const Holder holder;
     Upsert("one");
+    index_->ApplyChanges();
     EXPECT_EQ(FailureOf([&] { index_->Commit(); }).GetCode(), Code::kBusy);
     index_->DoWork();
     EXPECT_FALSE(index_->HasWork()) << "it must not be tried again without end";

@@ -6,11 +6,13 @@
 #include <array>
 #include <cerrno>
 #include <chrono>
+#include <cstring>
 #include <string>
 
 #include "host/framing.h"
 #include "host/searchd/connection.h"
 #include "host/searchd/durable_file.h"
+#include "host/searchd/registry.h"
 #include "host/searchd/request_error.h"
 #include "tests/unit/host/temp_dir.h"
 #include "tests/unit/searchd/failing_calls.h"
@@ -18,7 +20,9 @@
 namespace searchd {
 namespace {
 
+using ::testing::AllOf;
 using ::testing::ElementsAre;
+using ::testing::HasSubstr;
 
 class ReplaceFileTest : public ::testing::Test {
  protected:
@@ -48,6 +52,66 @@ TEST_F(ReplaceFileTest, AFailureKeepsTheOldFileAndLeavesNothingBehind) {
     EXPECT_EQ(ReadFile(file_), "old");
     EXPECT_THAT(dir_.Names(), ElementsAre("it"));
   }
+}
+
+TEST_F(ReplaceFileTest, AFileWhoseNameMayBeLostIsAFailure) {
+  // The directory cannot be opened, or not be synced as the file was.
+  for (const FailingCall& call : {FailingCall{"open", EMFILE, 1}, FailingCall{"fsync", EIO, 1}}) {
+    failing_call = call;
+    EXPECT_THROW(ReplaceFile(file_, "new"), RequestError) << call.name;
+    EXPECT_THAT(dir_.Names(), ElementsAre("it"));
+  }
+}
+
+TEST_F(ReplaceFileTest, AFileMayBeNamedFromWhereTheProcessIs) {
+  ASSERT_EQ(chdir(dir_.Path().c_str()), 0);
+  ReplaceFile("it", "new");
+  EXPECT_EQ(ReadFile(file_), "new");
+  ASSERT_EQ(chdir("/"), 0);
+}
+
+class RegistryRefusalTest : public ::testing::Test {
+ protected:
+  RegistryRefusalTest() { Registry(file_).Save({kEntry}); }
+  ~RegistryRefusalTest() override { failing_call = {}; }
+
+  // Loads the registry, and expects a failure of storage.
+  std::string FailureOfLoading() const {
+    std::string damage;
+    try {
+      Registry(file_).Load(damage);
+    } catch (const RequestError& e) {
+      EXPECT_EQ(e.GetCode(), Code::kStorage);
+      return e.what();
+    }
+    ADD_FAILURE() << "nothing failed";
+    return "";
+  }
+
+  const std::string kEntry =
+      R"({"id":"a","path":"/var/packages/a","mappings":{"property_id":"id"}})";
+  const TempDir dir_;
+  const std::string file_ = dir_ / "indexes.json";
+};
+
+TEST_F(RegistryRefusalTest, OneThatCannotBeReadForNowIsNoDamagedOne) {
+  const std::string content = ReadFile(file_);
+  for (const int error : {EIO, EMFILE, ENFILE, ENOMEM, EINTR, EACCES}) {
+    failing_call = {"open", error, 0};
+    EXPECT_THAT(FailureOfLoading(), HasSubstr(std::strerror(error)));
+    EXPECT_THAT(dir_.Names(), ElementsAre("indexes.json"));
+    EXPECT_EQ(ReadFile(file_), content);
+  }
+  std::string damage;
+  EXPECT_EQ(Registry(file_).Load(damage).size(), 1U);
+}
+
+TEST_F(RegistryRefusalTest, ADamagedOneThatCannotBeSetAsideStays) {
+  dir_.Write("indexes.json", "{");
+  failing_call = {"rename", EROFS, 0};
+  EXPECT_THAT(FailureOfLoading(),
+              AllOf(HasSubstr("cannot set aside " + file_), HasSubstr(std::strerror(EROFS))));
+  EXPECT_EQ(ReadFile(file_), "{");
 }
 
 class ConnectionTest : public ::testing::Test {
@@ -88,6 +152,12 @@ TEST_F(ConnectionTest, AClientThatIsGoneIsDoneWith) {
   failing_call = {"recv", ECONNRESET, 0};
   connection.Continue();
   EXPECT_EQ(connection.GetState(), Connection::State::kDone);
+}
+
+TEST_F(ConnectionTest, AClientIsWhoItsSystemSaysOrElseNobody) {
+  EXPECT_EQ(Connection(dup(daemon_), never_).Client(), geteuid());
+  failing_call = {"getsockopt", ENOBUFS, 0};
+  EXPECT_EQ(Connection(daemon_, never_).Client(), 65534U) << "never root";
 }
 
 TEST_F(ConnectionTest, AReplyThatNobodyTakesWaits) {

@@ -11,6 +11,7 @@
 #include <unistd.h>
 
 #include <algorithm>
+#include <array>
 #include <cerrno>
 #include <chrono>
 #include <csignal>
@@ -171,6 +172,13 @@ TEST_F(ProcessTest, ASocketThatSomebodyListensOnIsLeftAlone) {
   EXPECT_THAT(dir_.Names(), ElementsAre("it"));
 }
 
+TEST_F(ProcessTest, ASocketThatMayNotBeConnectedToCountsAsInUse) {
+  close(MakeSocketFile(file_));
+  failing_call = {"connect", EACCES, 0};
+  EXPECT_THAT(MessageOf([&] { const SocketFile socket_file(file_); }), HasSubstr("in use"));
+  EXPECT_THAT(dir_.Names(), ElementsAre("it"));
+}
+
 TEST_F(ProcessTest, WhatIsNoSocketIsLeftAlone) {
   dir_.Write("it", "kept");
   EXPECT_THAT(MessageOf([&] { const SocketFile socket_file(file_); }), HasSubstr("not a socket"));
@@ -197,7 +205,8 @@ TEST_P(RefusedSocketTest, IsAFailureThatLeavesTheMask) {
 
 INSTANTIATE_TEST_SUITE_P(, RefusedSocketTest,
                          ::testing::Values(Refusal{"socket", EMFILE}, Refusal{"bind", EACCES},
-                                           Refusal{"listen", EADDRINUSE}, Refusal{"rename", EIO}),
+                                           Refusal{"listen", EADDRINUSE}, Refusal{"rename", EIO},
+                                           Refusal{"lstat", EIO}, Refusal{"lstat", EIO, 2}),
                          NameOf);
 
 class RefusedReplacementTest : public RefusedTest {};
@@ -234,10 +243,13 @@ INSTANTIATE_TEST_SUITE_P(, RefusedBackgroundTest,
                          ::testing::Values(Refusal{"pipe2", EMFILE}, Refusal{"fork", EAGAIN}),
                          NameOf);
 
-// The exit status of a command that goes to the background and does this there.
-int StatusOfCommand(const std::function<void(int ready)>& in_background) {
+// The exit status of a command that goes to the background and does this there, with `call`
+// failing.
+int StatusOfCommand(const std::function<void(int ready)>& in_background,
+                    const FailingCall& call = {}) {
   const pid_t command = fork();
   if (command == 0) {
+    failing_call = call;
     in_background(GoToBackground());
     _exit(0);
   }
@@ -250,6 +262,22 @@ TEST_F(ProcessTest, ACommandEndsAsWhatItLeavesInTheBackground) {
   EXPECT_EQ(StatusOfCommand([](int ready) { ReportReady(ready); }), 0);
   EXPECT_EQ(StatusOfCommand([](int) { _exit(5); }), 5);
   EXPECT_EQ(StatusOfCommand([](int) { raise(SIGKILL); }), 1);
+}
+
+TEST_F(ProcessTest, ACommandThatIsInterruptedGoesOnWaiting) {
+  for (const char* call : {"read", "waitpid"}) {
+    EXPECT_EQ(StatusOfCommand([](int) { _exit(5); }, {call, EINTR, 0}), 5);
+  }
+}
+
+TEST_F(ProcessTest, ToldNobodyThatItIsReadyItGoesOnWithoutAnError) {
+  std::array<int, 2> ends{};
+  ASSERT_EQ(pipe2(ends.data(), O_CLOEXEC), 0);
+  const UniqueFd nobody_reads(ends[0]);
+  failing_call = {"write", EPIPE, 0};
+  ReportReady(ends[1]);
+  EXPECT_EQ(errno, 0) << "to be logged later";
+  EXPECT_EQ(fcntl(ends[1], F_GETFD), -1) << "closed";
 }
 
 class RefusedCheckerTest : public RefusedTest {};
@@ -304,7 +332,8 @@ TEST_P(RefusedServerTest, IsAFailure) {
 
 INSTANTIATE_TEST_SUITE_P(, RefusedServerTest,
                          ::testing::Values(Refusal{"epoll_create1", EMFILE},
-                                           Refusal{"eventfd", EMFILE}),
+                                           Refusal{"eventfd", EMFILE}, Refusal{"epoll_ctl", ENOMEM},
+                                           Refusal{"epoll_ctl", ENOSPC, 1}),
                          NameOf);
 
 TEST_F(ProcessTest, ADirectoryThatCannotBeMadeIsNamed) {
@@ -315,6 +344,9 @@ TEST_F(ProcessTest, ADirectoryThatCannotBeMadeIsNamed) {
   failing_call = {"chmod", EPERM, 1};
   EXPECT_THAT(MessageOf([&] { MakeDirectories(dir_ / "a/b", 0700); }),
               HasSubstr((dir_ / "a/b") + ": " + std::strerror(EPERM)));
+  failing_call = {"fsync", EIO, 0};  // of the directory above it
+  EXPECT_THAT(MessageOf([&] { MakeDirectories(dir_ / "a/b/c", 0700); }),
+              HasSubstr((dir_ / "a/b/c") + ": " + std::strerror(EIO)));
 }
 
 }  // namespace

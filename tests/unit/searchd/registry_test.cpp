@@ -79,7 +79,8 @@ TEST_F(RegistryTest, ReplacesATornTemporaryFile) {
 TEST_F(RegistryTest, SetsADamagedFileAside) {
   const Registry registry(File());
   for (const std::string text :
-       {"", "{", "[]", "{}", "{\"format\":2,\"indexes\":[]}", "{\"format\":1,\"indexes\":[{}]}",
+       {"", "{", "[]", "{}", "{\"format\":2,\"indexes\":[]}", "{\"format\":1,\"indexes\":{}}",
+        "{\"format\":1,\"indexes\":[{}]}", "{\"format\":1,\"indexes\":[{\"id\":\"a\"}]}",
         "{\"format\":1,\"indexes\":[{\"id\":\"a\",\"path\":\"/etc\",\"mappings\":{}}]}",
         "{\"format\":1,\"indexes\":[{\"id\":\"a\",\"path\":\"/var/packages/"
         "a\",\"mappings\":{}}]}"}) {
