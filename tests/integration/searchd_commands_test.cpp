@@ -118,8 +118,18 @@ TEST_F(SearchdCommands, RejectsMalformedRequests) {
       {R"({"command":"search","data":{"id":"appindex_enu"}})", "603", "\"query\""},
       {R"({"command":"search","data":{"id":"appindex_enu","query":"a","limit":1001}})", "603",
        "\"limit\""},
+      {R"({"command":"search","data":{"id":"appindex_enu","query":"a","limit":"5"}})", "603",
+       "\"limit\""},
       {R"({"command":"search","data":{"id":"appindex_enu","query":"a","offset":-1}})", "603",
        "\"offset\""},
+      {R"({"command":"search","data":{"id":"appindex_enu","query":"a","explain":1}})", "603",
+       "\"explain\""},
+      {R"({"command":"index_create","data":{"id":"a","path":"/var/packages/a",)"
+       R"("settings":{"shards":1},"mappings":{"property_id":"id"}}})",
+       "603", "\"settings\""},
+      {R"({"command":"index_create","data":{"id":"a","path":"/var/packages/a",)"
+       R"("settings":"default","mappings":{"property_id":"id"}}})",
+       "603", "\"settings\""},
       {R"({"command":"document_upsert_by_id","data":{"id":"appindex_enu","doc_id":"a"}})", "603",
        "\"data\""},
       {R"({"command":"document_upsert_by_id",)"

@@ -28,6 +28,11 @@ class SearchdLog : public SearchdTest {
     return lines;
   }
 
+  static void ReplaceByAFullDirectory(const fs::path& file) {
+    fs::remove(file);
+    fs::create_directories(file / "precious");
+  }
+
   std::unique_ptr<DatagramSocket> log_;
 };
 
@@ -100,6 +105,35 @@ TEST_F(SearchdLog, HasOneLineForADamagedRegistryHoweverOftenItsIndexesAreAsked) 
   const std::vector<std::string> lines = LinesUntil("stopped");
   ASSERT_EQ(lines.size(), 3U) << "the registry, the start, the stop";
   EXPECT_NE(lines[0].find("indexes.json"), std::string::npos) << lines[0];
+}
+
+TEST_F(SearchdLog, NamesFilesOfADeletedIndexThatCannotBeRemoved) {
+  Start();
+  Fill("enu");
+  ReplaceByAFullDirectory(IndexFile("enu", "postlist.glass"));
+  Delete("enu");
+  Fill("ger");  // its commit makes the deletion durable
+  const std::string line = LinesUntil("files of a deleted index stay").back();
+  EXPECT_NE(line.find("enu/postlist.glass"), std::string::npos) << line;
+  Restart(SIGTERM);
+  EXPECT_EQ(Find("enu", "file"), "601");
+  EXPECT_EQ(Find("ger", "file"), "files");
+}
+
+// What a daemon leaves that is killed while it makes an index anew where it was deleted.
+TEST_F(SearchdLog, NamesFilesThatCannotBeEmptiedAtTheStart) {
+  Start();
+  Fill("enu");
+  Fill("ger");
+  daemon_->Stop(SIGTERM);
+  LinesUntil("stopped");
+  WriteFileOf(IndexFile("enu", "tovoelasticd.emptied"), "");
+  ReplaceByAFullDirectory(IndexFile("enu", "postlist.glass"));
+  Start();
+  const std::string line = LinesUntil("storage failure").back();
+  EXPECT_NE(line.find("enu/postlist.glass"), std::string::npos) << line;
+  EXPECT_EQ(Find("enu", "file"), "605");
+  EXPECT_EQ(Find("ger", "file"), "files");
 }
 
 }  // namespace

@@ -152,10 +152,20 @@ TEST_F(SearchdLife, ReportsAFailedStartInTheBackground) {
 TEST_F(SearchdLife, ExplainsItsOptions) {
   EXPECT_EQ(SearchdProcess({"--version"}, false).Wait().status, 0);
   EXPECT_EQ(SearchdProcess({"--help"}, false).Wait().status, 0);
-  for (const std::vector<std::string>& arguments : std::vector<std::vector<std::string>>{
-           {"--colour"}, {"--root"}, {"now"}, {"--ready-fd", "x"}}) {
+  for (const std::vector<std::string>& arguments :
+       std::vector<std::vector<std::string>>{{"--colour"},
+                                             {"--root"},
+                                             {"--root", ""},
+                                             {"now"},
+                                             {"--ready-fd", "x"},
+                                             {"--ready-fd", "-1"},
+                                             {"--ready-fd", "1000"},
+                                             {"--time-limit", "0"},
+                                             {"--time-limit", "3601"},
+                                             {"--time-limit", "5s"}}) {
     const SearchdProcess::Result result = SearchdProcess(arguments, false).Wait();
     EXPECT_EQ(result.status, 2) << arguments[0];
+    EXPECT_NE(result.error_text.find(arguments[0]), std::string::npos) << result.error_text;
     EXPECT_NE(result.error_text.find("--help"), std::string::npos);
   }
   const SearchdProcess::Result result =

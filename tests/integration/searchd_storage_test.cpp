@@ -28,6 +28,7 @@ TEST_F(SearchdStorage, KeepsIndexesWhereTheyBelong) {
   EXPECT_EQ(code("/var/packages/"), 603);
   EXPECT_EQ(code("/var/packages/../../etc/x"), 603);
   EXPECT_EQ(code("/var/packages/a//b"), 603);
+  EXPECT_EQ(code("/var/packages/a/./b"), 603);
   EXPECT_EQ(code("/var/packages/" + std::string(2000, 'a')), 603);
 
   fs::create_directory_symlink("/etc", Outside("/var/packages/link"));

@@ -50,7 +50,10 @@ class SearchdSystemd : public SearchdTest {
   }
 
   void ExpectRefused(const std::vector<int>& sockets, const std::string& why) const {
-    const auto process = Launch({}, [&] { HandOver(sockets); });
+    ExpectRefused([&] { HandOver(sockets); }, why);
+  }
+  void ExpectRefused(const std::function<void()>& hand_over, const std::string& why) const {
+    const auto process = Launch({}, hand_over);
     EXPECT_FALSE(process->IsReady());
     const SearchdProcess::Result result = process->Wait();
     EXPECT_EQ(result.status, 1);
@@ -141,6 +144,15 @@ TEST_F(SearchdSystemd, IsRefusedSeveralSockets) {
   const Fd listener = Listener();
   ASSERT_EQ(listen(listener.Get(), 10), 0);
   ExpectRefused({listener.Get(), listener.Get()}, "2 sockets were handed over, there must be one");
+}
+
+TEST_F(SearchdSystemd, IsRefusedANumberOfSocketsThatIsNone) {
+  ExpectRefused(
+      [] {
+        setenv("LISTEN_FDS", "some", 1);
+        setenv("LISTEN_PID", std::to_string(getpid()).c_str(), 1);
+      },
+      "LISTEN_FDS: Invalid argument");
 }
 
 TEST_F(SearchdSystemd, IsIgnoredWhenItMeansAnotherProcess) {
