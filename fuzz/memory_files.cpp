@@ -1,6 +1,7 @@
 #include "fuzz/memory_files.h"
 
 #include <cerrno>
+#include <cstdint>
 #include <optional>
 
 #include "common/file_io.h"
@@ -36,6 +37,17 @@ bool velkor::ReadRegularFile(const std::string& path, std::size_t limit, std::st
   const std::string* file = fuzz::Find(path, limit);
   if (file != nullptr) content = *file;
   return file != nullptr;
+}
+
+// In two pieces, the first of which ends in the middle of a line as a rule.
+bool velkor::ReadRegularFile(const std::string& path,
+                             const std::function<void(std::string_view)>& take) {
+  const std::string* file = fuzz::Find(path, SIZE_MAX);
+  if (file == nullptr) return false;
+  const std::string_view content = *file;
+  take(content.substr(0, content.size() / 2));
+  take(content.substr(content.size() / 2));
+  return true;
 }
 
 bool velkor::ReplaceFile(const std::string& /*path*/, const std::string& /*content*/,

@@ -4,11 +4,16 @@
 
 namespace host::sdk {
 
+namespace {
+
+bool IsBlank(char c) { return c == ' ' || c == '\t' || c == '\r'; }
+
+}  // namespace
+
 std::string_view Trim(std::string_view text) {
-  constexpr std::string_view kBlanks = " \t\r";
-  const std::size_t first = text.find_first_not_of(kBlanks);
-  if (first == std::string_view::npos) return {};
-  return text.substr(first, text.find_last_not_of(kBlanks) - first + 1);
+  while (!text.empty() && IsBlank(text.front())) text.remove_prefix(1);
+  while (!text.empty() && IsBlank(text.back())) text.remove_suffix(1);
+  return text;
 }
 
 std::string_view TakeLine(std::string_view& rest) {
@@ -29,6 +34,7 @@ std::optional<Assignment> SplitAssignment(std::string_view line) {
 std::optional<std::string> Unquote(std::string_view quoted, const Quoting& quoting) {
   const char mark = quoted.front();
   std::string text;
+  std::size_t run = 1;  // from here to `at`: not yet in `text`
   for (std::size_t at = 1; at < quoted.size(); ++at) {
     const char c = quoted[at];
     if (c == mark) {
@@ -36,19 +42,17 @@ std::optional<std::string> Unquote(std::string_view quoted, const Quoting& quoti
       if (!rest.empty() && quoting.comment_marks.find(rest.front()) == std::string_view::npos) {
         return std::nullopt;
       }
+      text += quoted.substr(run, at - run);
       return text;
     }
-    if (c != '\\' || at + 1 == quoted.size()) {
-      text += c;
-      continue;
-    }
-    const char next = quoted[++at];
-    const std::optional<char> meant = quoting.unescape(next);
+    if (c != '\\' || at + 1 == quoted.size()) continue;
+    const std::optional<char> meant = quoting.unescape(quoted[at + 1]);
     if (meant) {
+      text += quoted.substr(run, at - run);
       text += *meant;
-    } else {
-      text += {c, next};
+      run = at + 2;
     }
+    ++at;
   }
   return std::nullopt;
 }

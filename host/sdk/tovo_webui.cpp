@@ -51,7 +51,8 @@ Json::Value ParseStrings(std::string_view rest) {
     const std::optional<std::string> text = sdk::Unquote(split->value, {Unescape, kCommentMarks});
     if (!text) continue;
     if (section_texts == nullptr) section_texts = &texts[section];
-    (*section_texts)[std::string(split->key)] = *text;
+    const std::string_view key = split->key;
+    *section_texts->demand(key.data(), key.data() + key.size()) = *text;
   }
   return texts;
 }

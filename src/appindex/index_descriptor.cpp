@@ -26,20 +26,25 @@ bool IsForThisDevice(const Json::Value& item) {
   return IsPassFilter(item["enable"], true) && IsPassFilter(item["disable"], false);
 }
 
-// What an entry and a module have in common.
-Json::Value MakeRecord(const std::string& conf_path, const Json::Value& item,
-                       const Json::Value& entry) {
+// The member of a record, whose name is not copied.
+template <std::size_t size>
+Json::Value& Member(Json::Value& record, const char (&name)[size]) {
+  return record[Json::StaticString(name)];
+}
+
+// What an entry and a module have in common. The texts and keywords are taken out of `item`.
+Json::Value MakeRecord(const std::string& conf_path, Json::Value& item, const Json::Value& entry) {
   Json::Value record(Json::objectValue);
-  record["path"] = conf_path;
-  record["title"] = item["title"];
-  record["desc"] = item["desc"];
-  record["keywords"] = item["keywords"];
-  record["stringset"] = entry["stringset"];
+  Member(record, "path") = conf_path;
+  Member(record, "title").swap(Member(item, "title"));
+  Member(record, "desc").swap(Member(item, "desc"));
+  Member(record, "keywords").swap(Member(item, "keywords"));
+  Member(record, "stringset") = entry["stringset"];
   return record;
 }
 
 // Returns whether there was nothing to complain about.
-bool AppendModule(Json::Value& records, const std::string& conf_path, const Json::Value& module,
+bool AppendModule(Json::Value& records, const std::string& conf_path, Json::Value& module,
                   const Json::Value& entry) {
   if (!module.isObject() || !IsForThisDevice(module)) return true;
   const Json::Value& app = entry["app"];
@@ -49,20 +54,20 @@ bool AppendModule(Json::Value& records, const std::string& conf_path, const Json
     return false;
   }
   Json::Value record = MakeRecord(conf_path, module, entry);
-  record["id"] = app.asString() + kModuleIdSeparator + params.asString();
-  record["owner"] = app;
+  Member(record, "id") = app.asString() + kModuleIdSeparator + params.asString();
+  Member(record, "owner") = app;
   records.append(std::move(record));
   return true;
 }
 
-bool AppendEntry(Json::Value& records, const std::string& conf_path, const Json::Value& entry) {
+bool AppendEntry(Json::Value& records, const std::string& conf_path, Json::Value& entry) {
   if (!entry.isObject() || !IsForThisDevice(entry)) return true;
   Json::Value record = MakeRecord(conf_path, entry, entry);
-  record["id"] = entry["app"];
-  record["owner"] = "";
+  Member(record, "id") = entry["app"];
+  Member(record, "owner") = "";
   records.append(std::move(record));
   bool complete = true;
-  for (const Json::Value& module : entry["modules"]) {
+  for (Json::Value& module : entry["modules"]) {
     complete = AppendModule(records, conf_path, module, entry) && complete;
   }
   return complete;
@@ -98,7 +103,7 @@ void Descriptor::Parse(std::string text) {
   if (root.isObject()) {
     complete = AppendEntry(records_, conf_path_, root);
   } else {
-    for (const Json::Value& entry : root) {
+    for (Json::Value& entry : root) {
       complete = AppendEntry(records_, conf_path_, entry) && complete;
     }
   }
@@ -122,10 +127,9 @@ bool FindIndexConfIn(std::string& conf_path, const std::string& find_dir, unsign
       conf_path = child;
       return true;
     }
-    if (depth < kMaxSearchDepth && IsDirExist(child, true) &&
-        FindIndexConfIn(conf_path, child + "/", depth + 1, searched)) {
-      return true;
-    }
+    if (depth >= kMaxSearchDepth || !IsDirExist(child, true)) continue;
+    if (dir.MayBeLink()) searched.FollowLink();
+    if (FindIndexConfIn(conf_path, child + "/", depth + 1, searched)) return true;
   }
   searched.Add(dir, level);
   return false;

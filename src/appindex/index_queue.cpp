@@ -4,11 +4,10 @@
 #include <sys/stat.h>
 #include <unistd.h>
 
-#include <algorithm>
 #include <cerrno>
 #include <cstdio>
 #include <cstring>
-#include <limits>
+#include <string_view>
 
 #include "appindex/elastic_control_internal.h"
 #include "appindex/error.h"
@@ -99,17 +98,23 @@ bool IsStillTheBatch(const UniqueFd& batch) {
 }  // namespace
 
 Batch ReadBatch(const std::string& path) {
-  std::string text;
-  CheckOrThrow(
-      ReadRegularFile(path, std::numeric_limits<std::size_t>::max(), text),
-      {kIndexMgr, 340, "ProcessQueue"}, "!input_stream", Error::kGeneralError,
-      [] { return std::string("Failed to open appindex queue, reason=") + std::strerror(errno); });
   Batch batch;
-  for (std::size_t begin = 0; begin < text.size();) {
-    const std::size_t end = std::min(text.find('\n', begin), text.size());
-    ReadLine(batch, text.substr(begin, end - begin));
-    begin = end + 1;
-  }
+  std::string line;  // as much of it as has been read
+  const auto take = [&](std::string_view piece) {
+    for (;;) {
+      const std::size_t end = piece.find('\n');
+      line += piece.substr(0, end);
+      if (end == std::string_view::npos) return;
+      ReadLine(batch, line);
+      line.clear();
+      piece.remove_prefix(end + 1);
+    }
+  };
+  CheckOrThrow(
+      ReadRegularFile(path, take), {kIndexMgr, 340, "ProcessQueue"}, "!input_stream",
+      Error::kGeneralError,
+      [] { return std::string("Failed to open appindex queue, reason=") + std::strerror(errno); });
+  if (!line.empty()) ReadLine(batch, line);
   return batch;
 }
 

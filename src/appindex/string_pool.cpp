@@ -25,6 +25,7 @@ constexpr int kMaxSearchDepth = 5;
 
 template <typename Texts>
 void FillTexts(Texts& texts, const Json::Value& section) {
+  texts.reserve(section.size());
   for (auto text = section.begin(); text != section.end(); ++text) {
     auto& entry = texts[text.name()];
     if (isJsonType<std::string>(*text)) entry = text->asString();
@@ -67,7 +68,9 @@ bool FindTextRootIn(std::string& out, const std::string& find_dir, int depth,
       out = child;
       return true;
     }
-    if (depth < kMaxSearchDepth && FindTextRootIn(out, child, depth + 1, searched)) return true;
+    if (depth >= kMaxSearchDepth) continue;
+    if (dir.MayBeLink()) searched.FollowLink();
+    if (FindTextRootIn(out, child, depth + 1, searched)) return true;
   }
   searched.Add(dir, depth);
   return false;

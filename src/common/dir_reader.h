@@ -29,13 +29,19 @@ class DirReader {
   bool Next(std::string& name) {
     while (const dirent64* entry = readdir64(dir_)) {
       name = static_cast<const char*>(entry->d_name);
+      type_ = entry->d_type;
       if (name != "." && name != "..") return true;
     }
     return false;
   }
 
+  // Whether the entry that Next gave last may be a link: it is one, or the file system does not say
+  // what it is.
+  bool MayBeLink() const { return type_ == DT_LNK || type_ == DT_UNKNOWN; }
+
  private:
   DIR* dir_;
+  unsigned char type_ = DT_UNKNOWN;
 };
 
 }  // namespace velkor

@@ -6,6 +6,7 @@
 #include <sys/stat.h>
 #include <unistd.h>
 
+#include <array>
 #include <cerrno>
 #include <cstdio>
 
@@ -14,6 +15,8 @@
 
 namespace velkor {
 namespace {
+
+constexpr std::size_t kPieceBytes = 16384;
 
 bool FailWith(int error) {
   errno = error;
@@ -92,16 +95,26 @@ bool FillFile(UniqueFd& fd, const std::string& content, mode_t mode) {
          fd.Close();
 }
 
+// Opens a regular file for reading and looks at it. -1 with errno set when that fails.
+int OpenRegularFile(const std::string& path, struct stat& info) {
+  if (path.find('\0') != std::string::npos) {  // another name to the system
+    errno = ENOENT;
+    return -1;
+  }
+  // Looked at before it is opened: that alone makes a watchdog run, winds a tape back, or gives the
+  // process a terminal. Once open, it may be another file.
+  if (stat(path.c_str(), &info) != 0 || !IsRegular(info)) return -1;
+  UniqueFd fd(open(path.c_str(), O_RDONLY | O_NONBLOCK | O_NOCTTY | O_CLOEXEC));
+  if (!fd.IsOpen() || fstat(fd.Get(), &info) != 0 || !IsRegular(info)) return -1;
+  return fd.Release();
+}
+
 }  // namespace
 
 bool ReadRegularFile(const std::string& path, std::size_t limit, std::string& content) {
-  if (path.find('\0') != std::string::npos) return FailWith(ENOENT);  // another name to the system
-  // Looked at before it is opened: that alone makes a watchdog run, winds a tape back, or gives the
-  // process a terminal. Once open, it may be another file.
   struct stat info {};
-  if (stat(path.c_str(), &info) != 0 || !IsRegular(info)) return false;
-  const UniqueFd fd(open(path.c_str(), O_RDONLY | O_NONBLOCK | O_NOCTTY | O_CLOEXEC));
-  if (!fd.IsOpen() || fstat(fd.Get(), &info) != 0 || !IsRegular(info)) return false;
+  const UniqueFd fd(OpenRegularFile(path, info));
+  if (!fd.IsOpen()) return false;
   if (static_cast<std::size_t>(info.st_size) > limit) return FailWith(EFBIG);
 
   const int kept = errno;
@@ -123,6 +136,25 @@ bool ReadRegularFile(const std::string& path, std::size_t limit, std::string& co
   content.swap(text);
   errno = kept;  // a read that was interrupted and then went well is no failure
   return true;
+}
+
+bool ReadRegularFile(const std::string& path, const std::function<void(std::string_view)>& take) {
+  struct stat info {};
+  const UniqueFd fd(OpenRegularFile(path, info));
+  if (!fd.IsOpen()) return false;
+  std::array<char, kPieceBytes> piece;  // NOLINT: filled before it is read
+  for (;;) {
+    const int kept = errno;
+    const ssize_t n = read(fd.Get(), piece.data(), piece.size());
+    if (n == 0) return true;
+    if (n > 0) {
+      take({piece.data(), static_cast<std::size_t>(n)});
+    } else if (errno == EINTR) {
+      errno = kept;  // an interruption is no failure
+    } else {
+      return false;
+    }
+  }
 }
 
 bool ReplaceFile(const std::string& path, const std::string& content, mode_t mode) {

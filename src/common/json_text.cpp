@@ -29,14 +29,25 @@ std::unique_ptr<Json::CharReader> MakeStrictReader() {
   return std::unique_ptr<Json::CharReader>(builder.newCharReader());
 }
 
+// Where the string that begins at `begin` has its closing quote; npos when it has none.
+std::size_t EndOfString(const std::string& text, std::size_t begin) {
+  std::size_t end = begin;
+  while ((end = text.find('"', end + 1)) != std::string::npos) {
+    std::size_t backslashes = 0;
+    while (text[end - backslashes - 1] == '\\') ++backslashes;  // the opening quote is none
+    if (backslashes % 2 == 0) break;
+  }
+  return end;
+}
+
 // The reader passes over comments in some places even when they are not allowed. Outside of its
 // strings no JSON text has a slash.
 bool HasComment(const std::string& text) {
-  bool in_string = false;
   for (std::size_t i = 0; i < text.size(); ++i) {
-    if (text[i] == '"') in_string = !in_string;
-    if (text[i] == '\\' && in_string) ++i;
-    if (text[i] == '/' && !in_string) return true;
+    if (text[i] == '/') return true;
+    if (text[i] != '"') continue;
+    i = EndOfString(text, i);
+    if (i == std::string::npos) return false;
   }
   return false;
 }

@@ -23,6 +23,13 @@ class UniqueFd {
   bool IsOpen() const { return fd_ >= 0; }
   int Get() const { return fd_; }
 
+  // Gives the descriptor away.
+  int Release() {
+    const int fd = fd_;
+    fd_ = -1;
+    return fd;
+  }
+
   // Closes now and returns whether that succeeded: for files whose content must have arrived.
   bool Close() {
     const int fd = fd_;

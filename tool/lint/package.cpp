@@ -72,6 +72,7 @@ void FindAll(Found& found, const Search& search, const std::string& dir, int dep
     if (name == search.name && (is_dir || !search.directories)) {
       (depth <= kReach ? found.near : found.deep).push_back(child);
     } else if (is_dir && depth < kReach + kFurther && (depth < kReach || !IsLink(dir + name))) {
+      if (reader.MayBeLink()) found.searched.FollowLink();
       FindAll(found, search, search.directories ? child : child + "/", depth + 1);
     }
   }

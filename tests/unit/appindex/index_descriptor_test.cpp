@@ -223,6 +223,19 @@ TEST_F(IndexDescriptor, ModuleWhoseParamsAreNoTextIsLoggedAndLeftOut) {
   EXPECT_THAT(TakeLog(), ElementsAre(MalformedLine(kConf)));
 }
 
+TEST_F(IndexDescriptor, WhatIsLoggedOfAnEntryIsLoggedAgainWhenItIsReadAgain) {
+  const std::string good = R"({"app":"A"})";
+  const std::string bad = R"({"app":"B","modules":[{"params":["p"]}]})";
+  for (const std::string& text : {"[" + good + "," + bad + "]", "[" + bad + "," + good + "]"}) {
+    test::WriteFile(kConf, text);
+    errno = 0;
+    Descriptor descriptor(kConf);
+    EXPECT_EQ(descriptor.FindIndexables().size(), 2U);
+    EXPECT_EQ(descriptor.FindIndexables().size(), 2U);
+    EXPECT_THAT(TakeLog(), ElementsAre(MalformedLine(kConf), MalformedLine(kConf))) << text;
+  }
+}
+
 TEST_F(IndexDescriptor, ModulesOfAnAppThatIsNoTextAreLoggedAndLeftOut) {
   const Json::Value records = Read(R"({"app":{"a":1},"modules":[{"params":"p"}]})", EACCES);
   ASSERT_EQ(records.size(), 1U);

@@ -7,7 +7,11 @@
 
 #include <cerrno>
 #include <cstdarg>
+#include <cstdio>
+#include <functional>
 #include <memory>
+#include <string>
+#include <vector>
 
 #include "appindex/index_mgr.h"
 #include "queue_test_fixture.h"
@@ -15,7 +19,8 @@
 namespace {
 
 bool g_open_of_batch_fails = false;
-int g_open_error = 0;  // 0: leaves errno as it is
+bool g_open_fails_once = false;  // and not again
+int g_open_error = 0;            // 0: leaves errno as it is
 
 }  // namespace
 
@@ -23,6 +28,7 @@ int g_open_error = 0;  // 0: leaves errno as it is
 extern "C" int open(const char* path, int flags, ...) {
   if (g_open_of_batch_fails && std::string(path) == test::kBatch) {
     if (g_open_error != 0) errno = g_open_error;
+    if (g_open_fails_once) g_open_of_batch_fails = false;
     return -1;
   }
   va_list arguments;
@@ -40,6 +46,7 @@ using test::ConfOf;
 using test::Enqueue;
 using test::FailureLine;
 using test::Install;
+using test::Joined;
 using test::kBatch;
 using test::kQueue;
 using test::kSucceed;
@@ -130,6 +137,65 @@ TEST_F(IndexQueueFailure, BatchThatMayNotBeReadIsThrown502) {
   ASSERT_EQ(seteuid(0), 0);
   EXPECT_EQ(error.code, Error::kGeneralError);
   EXPECT_EQ(test::ReadFile(kBatch), "{\"op\":3}\n");
+}
+
+// What stands in the batch's place.
+
+TEST_F(IndexQueueFailure, BatchThatCannotBeLookedAtIsNotReplacedByTheQueue) {
+  test::WriteFile(kBatch, Request(1, ConfOf("A")) + "\n");
+  Enqueue(R"({"op":3})");
+  ScriptedDaemon daemon(kSucceed);
+  test::Calls().lstat.fails_for = kBatch;
+  test::Calls().lstat.error = EIO;
+  ProcessQueue();
+  test::Calls().lstat.fails_for.clear();
+  EXPECT_EQ(test::ReadFile(kBatch), Request(1, ConfOf("A")) + "\n");
+  EXPECT_EQ(test::ReadFile(kQueue), "{\"op\":3}\n");
+  EXPECT_EQ(daemon.Connections(), 0);
+  ExpectUnlocked(test::kProcessLock);
+}
+
+// What a second processor does that somebody let in by removing the file of the process lock.
+class SecondProcessor : public IndexQueueFailure {
+ protected:
+  // Works a batch that adds A. `meanwhile` is done while its first document is written.
+  std::vector<std::string> CommandsWith(const std::function<void()>& meanwhile) {
+    Install("A");
+    Install("B");
+    test::WriteFile(kBatch, Request(1, ConfOf("A")) + "\n");
+    ScriptedDaemon daemon(kSucceed);
+    test::Time().on_usleep = [&](unsigned) {
+      test::Time().on_usleep = nullptr;
+      meanwhile();
+    };
+    ProcessQueue();
+    return daemon.Commands();
+  }
+};
+
+TEST_F(SecondProcessor, ThatHasBegunTheNextBatchDoesNotLoseIt) {
+  const auto commands = CommandsWith([] {
+    test::WriteFile("/tmp/next", Request(1, ConfOf("B")) + "\n");
+    ASSERT_EQ(rename("/tmp/next", kBatch), 0);
+  });
+  EXPECT_EQ(commands, Joined({AddCommands("A"), AddCommands("B")}));
+  EXPECT_FALSE(test::Exists(kBatch));
+}
+
+TEST_F(SecondProcessor, ThatHasFinishedTheBatchLeavesNothingToDo) {
+  EXPECT_EQ(CommandsWith([] { ASSERT_EQ(unlink(kBatch), 0); }), AddCommands("A"));
+  EXPECT_FALSE(test::Exists(kBatch));
+}
+
+TEST_F(IndexQueueFailure, BatchThatCannotBeToldFromAnotherIsWorkedOnceMore) {
+  Install("A");
+  test::WriteFile(kBatch, Request(1, ConfOf("A")) + "\n");
+  ScriptedDaemon daemon(kSucceed);
+  g_open_of_batch_fails = g_open_fails_once = true;
+  g_open_error = EMFILE;
+  ProcessQueue();
+  EXPECT_EQ(daemon.Commands(), Joined({AddCommands("A"), AddCommands("A")}));
+  EXPECT_FALSE(test::Exists(kBatch));
 }
 
 // Locks.

@@ -2,6 +2,7 @@
 
 #include <dirent.h>
 #include <dlfcn.h>
+#include <fcntl.h>
 #include <sys/stat.h>
 #include <unistd.h>
 
@@ -49,9 +50,14 @@ int rename(const char* from, const char* to) noexcept {
   return test::Fails(test::Calls().rename, to) ? -1 : real(from, to);
 }
 
+int lstat(const char* path, struct stat* info) noexcept {
+  return test::Fails(test::Calls().lstat, path)
+             ? -1
+             : fstatat(AT_FDCWD, path, info, AT_SYMLINK_NOFOLLOW);
+}
+
 DIR* opendir(const char* path) {
   static auto* const real = test::Real<DIR*(const char*)>("opendir");
-  if (test::Calls().on_opendir) test::Calls().on_opendir();
   return test::Fails(test::Calls().opendir, path) ? nullptr : real(path);
 }
 

@@ -2,7 +2,6 @@
 // the library's calls resolve to.
 #pragma once
 
-#include <functional>
 #include <string>
 #include <vector>
 
@@ -21,7 +20,7 @@ struct SystemCalls {
   SystemCall chmod;
   SystemCall rename;  // the path is the new name
   SystemCall opendir;
-  std::function<void()> on_opendir;  // called first thing in opendir
+  SystemCall lstat;
 };
 
 SystemCalls& Calls();

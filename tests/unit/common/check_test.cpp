@@ -6,6 +6,7 @@
 #include <cstdio>
 #include <cstring>
 #include <string>
+#include <thread>
 
 #include "tests/support/device_root_test.h"
 #include "tests/support/fake_user_db.h"
@@ -21,6 +22,7 @@ using velkor::Error;
 using velkor::LogFailure;
 using velkor::LogFailureText;
 using velkor::LogNotice;
+using velkor::MutedLog;
 
 constexpr CheckSite kSite = {"config", 45, "Save"};
 
@@ -243,6 +245,32 @@ TEST_F(CheckTest, WithoutASystemLogANoticeLeavesErrnoAsItWas) {
     LogNotice("index_mgr", 290, "Reindex app");
     EXPECT_EQ(errno, before);
   }
+}
+
+TEST_F(CheckTest, AMutedThreadWritesNoLinesAndItsChecksFailAsEver) {
+  errno = ENOENT;
+  {
+    const MutedLog muted;
+    LogFailure(false, kSite, "!done");
+    LogFailureText(kSite, "Malformed index.conf: {}");
+    LogNotice("index_mgr", 290, "Reindex app");
+    const Error error = FailedWith([] { return "why"; });
+    EXPECT_EQ(error.code, Error::kConfigSaveError);
+    EXPECT_EQ(error.reason, "why");
+    errno = EIO;
+  }
+  EXPECT_EQ(errno, ENOENT) << "it is as it was before";
+  EXPECT_THAT(TakeLog(), IsEmpty());
+  LogFailure(false, kSite, "!done");
+  EXPECT_THAT(TakeLog(), ElementsAre(Line("Failed [!done] [err: No such file or directory]")));
+}
+
+TEST_F(CheckTest, MutingIsNestedAndOfOneThread) {
+  const MutedLog muted;
+  { const MutedLog inner; }
+  LogNotice("index_mgr", 290, "still muted");
+  std::thread([] { LogNotice("index_mgr", 290, "of another thread"); }).join();
+  EXPECT_THAT(TakeLog(), ElementsAre("index_mgr:290 of another thread"));
 }
 
 }  // namespace

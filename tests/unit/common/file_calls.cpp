@@ -11,6 +11,8 @@
 #include <cstdio>
 #include <utility>
 
+#include "tests/support/open_mode.h"
+
 namespace test {
 namespace {
 
@@ -43,13 +45,10 @@ extern "C" {
 
 int open(const char* path, int flags, ...) {
   static auto* const real = test::Real<int(const char*, int, ...)>("open");
-  mode_t mode = 0;
-  if ((flags & O_CREAT) != 0) {
-    va_list arguments;
-    va_start(arguments, flags);
-    mode = va_arg(arguments, mode_t);
-    va_end(arguments);
-  }
+  va_list arguments;
+  va_start(arguments, flags);
+  const mode_t mode = test::OpenMode(flags, arguments);
+  va_end(arguments);
   return test::Fails("open", -1, path) ? -1 : real(path, flags, mode);
 }
 
@@ -85,6 +84,15 @@ int fchmod(int fd, mode_t mode) noexcept {
 int rename(const char* from, const char* to) noexcept {
   static auto* const real = test::Real<int(const char*, const char*)>("rename");
   return test::Fails("rename", -1, to) ? -1 : real(from, to);
+}
+
+int fstat(int fd, struct stat* info) noexcept {
+  return test::Fails("fstat", fd) ? -1 : fstatat(fd, "", info, AT_EMPTY_PATH);
+}
+
+ssize_t readlink(const char* path, char* content, size_t size) noexcept {
+  static auto* const real = test::Real<ssize_t(const char*, char*, size_t)>("readlink");
+  return test::Fails("readlink", -1, path) ? -1 : real(path, content, size);
 }
 
 int flock(int fd, int operation) noexcept {

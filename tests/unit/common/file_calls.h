@@ -7,11 +7,11 @@
 
 namespace test {
 
-// One call of open, close, read, write, fsync, fchmod, rename or flock.
+// One call of open, close, read, write, fsync, fchmod, rename, flock, fstat or readlink.
 struct FileCall {
   std::string name;
-  int fd;            // -1 for open and rename
-  std::string path;  // of open, and the new name of rename
+  int fd;            // -1 for those that take a path
+  std::string path;  // the new name of rename
 };
 
 // Fails a call with this errno, or lets it through.

@@ -1,14 +1,17 @@
 // Files that cannot be read, or that change while they are read.
 #include "common/file_io.h"
 
-#include <gtest/gtest.h>
+#include <gmock/gmock.h>
 #include <sys/stat.h>
 #include <unistd.h>
 
 #include <cerrno>
+#include <filesystem>
 #include <fstream>
 #include <functional>
 #include <string>
+#include <string_view>
+#include <vector>
 
 #include "file_calls.h"
 #include "tests/support/device_root_test.h"
@@ -47,6 +50,16 @@ class FileIoTest : public test::DeviceRootTest {
   static FileCallResult Append(const std::string& text) {
     std::ofstream(kPath, std::ios::app) << text;
     return {};
+  }
+
+  // The names in the root that begin with "file".
+  static std::vector<std::string> Files() {
+    std::vector<std::string> names;
+    for (const auto& entry : std::filesystem::directory_iterator("/")) {
+      const std::string name = entry.path().filename();
+      if (name.compare(0, 4, "file") == 0) names.push_back(name);
+    }
+    return names;
   }
 
   static void ExpectRefused(std::size_t limit, int error) {
@@ -95,11 +108,127 @@ TEST_F(FileIoTest, AFifoThatTakesTheFilesPlaceIsRefusedWithoutWaiting) {
   EXPECT_TRUE(opened.IsDone());
 }
 
+// Piece by piece.
+
+// What was given of the file, and errno; whether it was all of it.
+bool ReadInPieces(std::string& content, int& error) {
+  errno = 0;
+  const bool read = ReadRegularFile(kPath, [&](std::string_view piece) { content += piece; });
+  error = errno;
+  return read;
+}
+
+TEST_F(FileIoTest, PiecesAreTheWholeFileInOrder) {
+  std::string text;
+  for (int i = 0; i < 20000; ++i) text += std::to_string(i) + "\n";
+  test::WriteFile(kPath, text);
+  std::string content;
+  int error = -1;
+  EXPECT_TRUE(ReadInPieces(content, error));
+  EXPECT_EQ(content, text);
+  EXPECT_EQ(error, 0);
+}
+
+TEST_F(FileIoTest, PiecesGoOnAfterAnInterruptionWhichIsNoFailure) {
+  const Before read("read", [] { return EINTR; });
+  std::string content;
+  int error = -1;
+  EXPECT_TRUE(ReadInPieces(content, error));
+  EXPECT_EQ(content, "content");
+  EXPECT_EQ(error, 0);
+  EXPECT_TRUE(read.IsDone());
+}
+
+TEST_F(FileIoTest, PiecesThatCannotBeReadAreAFailure) {
+  const Before read("read", [] { return EIO; });
+  std::string content;
+  int error = -1;
+  EXPECT_FALSE(ReadInPieces(content, error));
+  EXPECT_EQ(error, EIO);
+}
+
+TEST_F(FileIoTest, PiecesOfWhatIsNoRegularFileAreNone) {
+  ASSERT_EQ(unlink(kPath), 0);
+  test::MakeDirs(kPath);
+  std::string content;
+  int error = -1;
+  EXPECT_FALSE(ReadInPieces(content, error));
+  EXPECT_EQ(error, EISDIR);
+  EXPECT_EQ(content, "");
+}
+
+// Replacing.
+
 TEST_F(FileIoTest, AnInterruptedWriteGoesOn) {
   const Before write("write", [] { return EINTR; });
   EXPECT_TRUE(ReplaceFile(kPath, "new", 0600));
   EXPECT_TRUE(write.IsDone());
   EXPECT_EQ(test::ReadFile(kPath), "new");
+}
+
+TEST_F(FileIoTest, AFileThatCannotBeLookedAtOnceItIsOpenIsRefused) {
+  const Before look("fstat", [] { return EIO; });
+  ExpectRefused(100, EIO);
+}
+
+TEST_F(FileIoTest, ANameWithANulIsNotThatOfTheFileBeforeIt) {
+  std::string content = "untouched";
+  EXPECT_FALSE(ReadRegularFile(kPath + std::string("\0.conf", 6), 100, content));
+  EXPECT_EQ(errno, ENOENT);
+  EXPECT_EQ(content, "untouched");
+}
+
+// Between making the temporary file and locking it.
+TEST_F(FileIoTest, ATemporaryFileThatAnotherWriterTookForALeftoverIsMadeAnew) {
+  const Before lock("flock", []() -> FileCallResult {
+    for (const std::string& name : Files()) {
+      if (name == "file") continue;
+      EXPECT_EQ(unlink(("/" + name).c_str()), 0);
+    }
+    return {};
+  });
+  EXPECT_TRUE(ReplaceFile(kPath, "new", 0600));
+  EXPECT_TRUE(lock.IsDone());
+  EXPECT_EQ(test::ReadFile(kPath), "new");
+  EXPECT_THAT(Files(), testing::ElementsAre("file"));
+}
+
+TEST_F(FileIoTest, WhereThereAreNoLocksAFileIsReplacedAllTheSame) {
+  const Before lock("flock", [] { return ENOLCK; });
+  EXPECT_TRUE(ReplaceFile(kPath, "new", 0600));
+  EXPECT_TRUE(lock.IsDone());
+  EXPECT_EQ(test::ReadFile(kPath), "new");
+}
+
+TEST_F(FileIoTest, ATemporaryFileThatCannotBeLookedAtIsWrittenAllTheSame) {
+  const Before look("fstat", [] { return EIO; });
+  EXPECT_TRUE(ReplaceFile(kPath, "new", 0600));
+  EXPECT_TRUE(look.IsDone());
+  EXPECT_EQ(test::ReadFile(kPath), "new");
+}
+
+TEST_F(FileIoTest, OnlyLeftoversOfTheFileItselfAreRemoved) {
+  test::WriteFile("/file.new.left12", "");
+  test::WriteFile("/life.new.left12", "");
+  EXPECT_TRUE(ReplaceFile(kPath, "new", 0600));
+  EXPECT_FALSE(test::Exists("/file.new.left12"));
+  EXPECT_TRUE(test::Exists("/life.new.left12"));
+}
+
+// Another writer holds its lock.
+TEST_F(FileIoTest, ATemporaryFileThatIsBeingWrittenStays) {
+  test::WriteFile("/file.new.kept12", "");
+  const Before lock("flock", [] { return EWOULDBLOCK; });
+  EXPECT_TRUE(ReplaceFile(kPath, "new", 0600));
+  EXPECT_TRUE(test::Exists("/file.new.kept12"));
+}
+
+// No writer makes one.
+TEST_F(FileIoTest, ALinkNamedLikeALeftoverStays) {
+  test::WriteFile("/elsewhere", "");
+  ASSERT_EQ(symlink("/elsewhere", "/file.new.link12"), 0);
+  EXPECT_TRUE(ReplaceFile(kPath, "new", 0600));
+  EXPECT_TRUE(test::Exists("/file.new.link12"));
 }
 
 }  // namespace

@@ -177,6 +177,16 @@ TEST_F(ChownVelkorTest, WithoutThePackagesUserThrows801WithoutAReasonOrALine) {
   velkor::sdk::SDKMutex().Unlock();
 }
 
+TEST_F(ChownVelkorTest, AUserWithoutARecordThrows801Too) {
+  UserDb().gives_null_records = true;
+  try {
+    velkor::ChownVelkor("/data/file");
+    ADD_FAILURE() << "did not throw";
+  } catch (const Error& error) {
+    EXPECT_EQ(error.code, Error::kChownError);
+  }
+}
+
 TEST_F(ChownVelkorTest, AChownThatFailsIsFalseAndNoException) {
   EXPECT_FALSE(velkor::ChownVelkor("/data/missing"));
   EXPECT_EQ(errno, ENOENT);

@@ -9,6 +9,7 @@
 #include <stdexcept>
 #include <string>
 
+#include "file_calls.h"
 #include "tests/support/device_root_test.h"
 
 namespace {
@@ -99,6 +100,16 @@ TEST_F(IsDirExistTest, IsFalseOfALinkToAFileOrToNothing) {
   MakeLink("/data/missing", "/data/to_nothing");
   EXPECT_FALSE(velkor::IsDirExist("/data/to_file", true));
   EXPECT_FALSE(velkor::IsDirExist("/data/to_nothing", true));
+}
+
+TEST_F(IsDirExistTest, IsFalseOfALinkThatIsGoneBeforeItIsRead) {
+  MakeLink("/data/dir", "/data/link");
+  const test::FileCallHook hook([](const test::FileCall& call) -> test::FileCallResult {
+    if (call.name == "readlink") unlink(call.path.c_str());
+    return {};
+  });
+  EXPECT_FALSE(velkor::IsDirExist("/data/link", true));
+  EXPECT_FALSE(Exists("/data/link"));
 }
 
 TEST_F(IsDirExistTest, IsFalseOfLinksThatLeadToThemselves) {

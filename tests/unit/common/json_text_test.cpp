@@ -117,6 +117,12 @@ TEST(FromStringTest, RefusesATornText) {
   EXPECT_FALSE(IsJson("tru"));
 }
 
+TEST(FromStringTest, RefusesABackslashOutsideOfATextWhateverFollows) {
+  EXPECT_FALSE(IsJson(R"([1] \)"));
+  EXPECT_FALSE(IsJson("[1 \\\"x\"]"));
+  EXPECT_FALSE(IsJson("[1 \\// x\n]"));
+}
+
 TEST(FromStringTest, RefusesWhatOnlyJavaScriptAllows) {
   EXPECT_FALSE(IsJson("'x'"));
   EXPECT_FALSE(IsJson("{'a':1}"));
