@@ -37,7 +37,7 @@ bool IsInApplication(const std::string& path) {
 std::string FindIn(const std::string& dir) {
   const velkor::MutedLog muted;
   std::string conf_path;
-  if (!index::FindIndexConfByAppRoot(conf_path, dir + "/", 0)) {
+  if (!index::FindIndexConfByAppRoot(conf_path, dir == "/" ? dir : dir + "/", 0)) {
     throw Failure(dir + ": there is no index.conf in it, nor up to five levels below",
                   "name a descriptor, or a directory that holds one");
   }

@@ -262,6 +262,19 @@ class CommandTest(unittest.TestCase):
                          "  /1: gives nothing: not an object\n"
                          "  /2/modules/0: gives nothing: not an object\n"
                          '  Example.App?p: "enable" lists no model and no platform\n')
+        result = self.run_in(SCRATCH, "--json", "show", "--model", "m", "--platform", "p", package)
+        left_out = json.loads(result.stdout)["descriptors"][0]["left_out"]
+        self.assertEqual([item["pointer"] for item in left_out],
+                         ["/0/modules/b", "/1", "/2/modules/0", "/0/modules/a"])
+        self.assertEqual(left_out[3], {"id": "Example.App?p", "pointer": "/0/modules/a",
+                                       "filter": "enable",
+                                       "reason": '"enable" lists no model and no platform'})
+
+    def test_show_of_what_is_no_descriptor(self):
+        result = self.run_in(SCRATCH, "show", "--model", "m", "--platform", "p", self.package(7))
+        self.assert_ends(result, DONE)
+        self.assertIn("\nLeft out on this device:\n"
+                      "  the descriptor: gives nothing: not an object\n", result.stdout)
 
     def test_show_says_what_to_do_when_the_device_has_no_name(self):
         (SCRATCH / "root/etc").mkdir(parents=True)

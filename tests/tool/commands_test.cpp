@@ -2,6 +2,7 @@
 #include <gmock/gmock.h>
 
 #include "tests/integration/real_device.h"
+#include "tests/support/scripted_daemon.h"
 #include "tests/tool/tool_process.h"
 
 namespace test {
@@ -120,6 +121,67 @@ TEST_F(Commands, RequestThatHoldsUpTheQueueIsNamed) {
                     EndsWith("(code 120)\n")));
 }
 
+TEST_F(Commands, QueuedRebuildNamesTheDescriptorThatHoldsItUp) {
+  WriteFile(ConfOf("Broken"), R"({"app":["no text"],"title":"Broken"})");
+  ASSERT_EQ(Run({"-q", "enqueue", "reindex"}).status, 0);
+  EXPECT_THAT(Failure({"process-queue"}, 1),
+              AllOf(StartsWith("appindex: " + ConfOf("Broken") + ": "), HasSubstr("holds up"),
+                    EndsWith("(code 120)\n")));
+}
+
+TEST_F(Commands, RequestIsNamedThatHoldsUpTheQueueWithoutACode) {
+  ASSERT_EQ(Run({"reindex"}).status, 0);
+  WriteFile(ConfOf("Broken"), R"({"app":"Broken","title":[]})");
+  ASSERT_EQ(Run({"-q", "enqueue", "add", ConfOf("Broken")}).status, 0);
+  EXPECT_THAT(Failure({"process-queue"}, 1),
+              AllOf(StartsWith("appindex: " + ConfOf("Broken") + ": a value stands where"),
+                    EndsWith("holds up the whole batch\n")));
+}
+
+TEST_F(Commands, RequestIsNamedThatTheDevicesNameHoldsUp) {
+  ASSERT_EQ(Run({"reindex"}).status, 0);
+  WriteFile("/etc/tovoinfo.conf", "");
+  WriteFile(ConfOf("Some"), R"({"app":"Some","title":"t","enable":{"model":["M1"]}})");
+  ASSERT_EQ(Run({"-q", "enqueue", "add", ConfOf("Some")}).status, 0);
+  EXPECT_THAT(Failure({"process-queue"}, 1),
+              AllOf(StartsWith("appindex: " + ConfOf("Some") + ": /etc/tovoinfo.conf: "),
+                    EndsWith("(code 502)\n")));
+}
+
+TEST_F(Commands, QueueThatCannotBeMovedAsideIsNamedAndKept) {
+  MakeDirs(kBatch);
+  ASSERT_EQ(Run({"-q", "enqueue", "reindex"}).status, 0);
+  EXPECT_THAT(Failure({"process-queue"}, 1),
+              AllOf(StartsWith(std::string("appindex: ") + kQueue + ": the queue cannot be moved"),
+                    EndsWith("(code 502)\n")));
+  EXPECT_EQ(ReadFile(kQueue), "{\"op\":3}\n");
+}
+
+TEST_F(Commands, BatchThatIsLeftWaitsForTheDaemonAsTheQueueDoes) {
+  daemon_.Stop();
+  WriteFile(kBatch, Request(1, ConfOf("Photos")) + "\n");
+  EXPECT_THAT(Failure({"process-queue"}, 4), HasSubstr("the requests stay queued"));
+  EXPECT_TRUE(Exists(kBatch));
+}
+
+// No descriptor is to blame, as far as can be told.
+TEST_F(Commands, RefusalOfTheDaemonIsGivenAsItIs) {
+  EXPECT_THAT(Failure({"del", "/var/packages/Photos"}, 1),
+              AllOf(HasSubstr("run `appindex reindex`"), EndsWith("(code 601)\n")));
+  daemon_.Stop();
+  const ScriptedDaemon daemon(
+      [](const Json::Value&) { return test::Failure(603, "not on a holiday"); });
+  ASSERT_EQ(Run({"-q", "enqueue", "add", "/var/packages/Photos"}).status, 0);
+  for (const std::vector<std::string>& arguments :
+       std::vector<std::vector<std::string>>{{"add", "/var/packages/Photos"}, {"process-queue"}}) {
+    EXPECT_THAT(Failure(arguments, 1),
+                AllOf(StartsWith(std::string("appindex: ") + kSocket +
+                                 ": the search daemon refuses: not on a holiday; "),
+                      EndsWith("(code 603)\n")));
+  }
+  EXPECT_TRUE(Exists(kBatch)) << "the request is lost";
+}
+
 TEST_F(Commands, FailureIsAlsoGivenAsJson) {
   const Finished finished = Run({"--json", "search", "--lang", "ger", "photo"});
   EXPECT_EQ(finished.status, 1);
@@ -157,6 +219,14 @@ TEST_F(Commands, NamesOfCommandsAreWordsOfAQueryToo) {
   EXPECT_EQ(Data({"search", "photo", "status", "reindex"})["query"].asString(),
             "photo status reindex");
   EXPECT_FALSE(Exists(kQueue));
+}
+
+TEST_F(Commands, LintOfTheRootChecksAllThatIsInstalled) {
+  const Json::Value checked = Data({"lint", "/"})["checked"];
+  ASSERT_EQ(checked.size(), 3U);
+  EXPECT_EQ(checked[0].asString(), ConfOf("Backup"));
+  EXPECT_EQ(checked[1].asString(), ConfOf("Photos"));
+  EXPECT_EQ(checked[2].asString(), kFilesConf);
 }
 
 TEST_F(Commands, HelpNamesEveryExitCode) {
@@ -210,6 +280,19 @@ TEST_F(Commands, SearchLimitsAndExplains) {
   const Finished finished = Run({"search", "--limit", "2", "--explain", "everything"});
   EXPECT_THAT(finished.out, HasSubstr("\"everything\" word in keywords"));
   EXPECT_THAT(finished.err, HasSubstr("(2 more: see --limit)"));
+}
+
+TEST_F(Commands, SearchShowsDescriptions) {
+  WriteFile(ConfOf("Notes"), R"({"app":"Notes","title":"Notebook","desc":"Keeps\nnotes."})");
+  ASSERT_EQ(Run({"reindex"}).status, 0);
+  EXPECT_EQ(Run({"search", "--lang", "enu", "notebook"}).out,
+            "  1. Notebook  (Notes)\n     Keeps notes.\n");
+}
+
+TEST_F(Commands, SearchSaysWhenAQueryIsTooLongToCountAsAWhole) {
+  ASSERT_EQ(Run({"reindex"}).status, 0);
+  const Finished finished = Run({"search", "--lang", "enu", "everything " + std::string(300, 'x')});
+  EXPECT_THAT(finished.err, HasSubstr("(the query is long: only its beginning counted)\n"));
 }
 
 TEST_F(Commands, SearchTakesSeveralWordsAsOneQuery) {

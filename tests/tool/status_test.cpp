@@ -6,6 +6,7 @@
 #include <unistd.h>
 
 #include "tests/integration/real_device.h"
+#include "tests/support/scripted_daemon.h"
 #include "tests/tool/tool_process.h"
 
 namespace test {
@@ -43,6 +44,16 @@ TEST_F(StatusCommand, WithoutTheDaemonTheRestIsTold) {
   EXPECT_EQ(status["queue"]["requests"].asInt(), 1);
   EXPECT_EQ(status["version"]["current"].asString(), kVersion);
   EXPECT_TRUE(status["indexes"].empty());
+}
+
+TEST_F(StatusCommand, DaemonThatRefusesEndsWith1) {
+  daemon_.Stop();
+  const test::Reaction refusal = Failure(605, "the registry cannot be read");
+  const ScriptedDaemon daemon({refusal, refusal});
+  const Finished finished = Run({"status"});
+  EXPECT_EQ(finished.status, 1);
+  EXPECT_THAT(finished.out, HasSubstr("Search daemon   refuses\n"));
+  EXPECT_EQ(Status()["daemon"]["code"].asInt(), 605);
 }
 
 TEST_F(StatusCommand, OrderIsThatOfTheLibrary) {

@@ -160,6 +160,38 @@ TEST_F(Terminal, SearchEmphasisesWhatKeywordsWereFoundBy) {
   EXPECT_THAT(tool.Output(), HasSubstr("\033[1mPhoto\033[0m Post"));
 }
 
+TEST_F(Terminal, DescriptionsAreWrappedToTheTerminal) {
+  WriteFile(
+      ConfOf("Notes"),
+      R"({"app":"Notes","title":"Notebook","desc":"Keeps notes and lists, and finds them."})");
+  Rebuild();
+  for (const int columns : {kNarrow, 5, 1}) {  // the latter have no room beside the indent
+    ToolInTerminal tool(Here(), columns, {"search", "--lang", "enu", "notebook"});
+    EXPECT_EQ(tool.Wait(), 0);
+    EXPECT_THAT(
+        tool.Output(),
+        HasSubstr(columns == kNarrow ? "     Keeps notes and lists,\r\n     and finds them.\r\n"
+                                     : "     Keeps\r\n     notes\r\n     and\r\n"))
+        << columns;
+  }
+}
+
+TEST_F(Terminal, EmptyNoColorTakesNothing) {
+  Rebuild();
+  ToolInTerminal tool(Here(), kUsual, {"search", "--lang", "ger", "foto"}, {{"NO_COLOR", ""}});
+  EXPECT_EQ(tool.Wait(), 0);
+  EXPECT_THAT(tool.Output(), HasSubstr("\033[1mFoto\033[0malbum"));
+}
+
+TEST_F(Terminal, WithoutAWidthHasTheUsualOne) {
+  Rebuild();
+  ToolInTerminal tool(Here(), 0, {"add", "/var/packages/Photos"});
+  EXPECT_EQ(tool.Wait(), 0);
+  const std::vector<std::string> frames = Frames(tool.Output());
+  ASSERT_THAT(frames, Not(IsEmpty()));
+  EXPECT_EQ(frames.front(), "[--------------------]   0%   0/21");
+}
+
 TEST_F(Terminal, NoColorTakesTheEmphasisAndLeavesTheProgress) {
   Rebuild();
   const Environment no_color = {{"NO_COLOR", "1"}};
@@ -223,6 +255,28 @@ TEST_F(Terminal, SigtermIsTreatedAsCtrlC) {
   tool.Signal(SIGTERM);
   EXPECT_EQ(tool.Wait(), 128 + SIGTERM);
   EXPECT_THAT(tool.Output(), HasSubstr("interrupted; a part of the documents is written"));
+}
+
+TEST_F(Terminal, SigtermWithoutProgressIsOneLine) {
+  Rebuild();
+  DaemonGate gate(5);
+  ToolInTerminal tool(Here(), kUsual, {"--quiet", "add", "/var/packages/Photos"});
+  gate.AwaitHeld();
+  tool.Signal(SIGTERM);
+  EXPECT_EQ(tool.Wait(), 128 + SIGTERM);
+  EXPECT_THAT(tool.Output(), testing::StartsWith("appindex: interrupted; "));
+}
+
+TEST_F(Terminal, HangUpThatWasIgnoredBeforeStaysIgnored) {
+  Rebuild();
+  ASSERT_NE(std::signal(SIGHUP, SIG_IGN), SIG_ERR);  // as nohup does
+  DaemonGate gate(5);
+  ToolInTerminal tool(Here(), kUsual, {"add", "/var/packages/Photos"});
+  gate.AwaitHeld();
+  tool.Signal(SIGHUP);
+  gate.Open();
+  EXPECT_EQ(tool.Wait(), 0);
+  EXPECT_THAT(tool.Output(), HasSubstr("Wrote 21 documents in"));
 }
 
 TEST_F(Terminal, FailureWipesTheProgressAndIsOneLine) {

@@ -3,7 +3,9 @@
 
 #include <gmock/gmock.h>
 #include <gtest/gtest.h>
+#include <unistd.h>
 
+#include <stdexcept>
 #include <string>
 #include <vector>
 
@@ -26,6 +28,20 @@ constexpr char kGoodDescriptor[] = R"({
 
 // A finding by its tag and its JSON pointer.
 MATCHER_P2(Is, tag, pointer, "") { return arg.tag == tag && arg.pointer == pointer; }
+
+// As long as it lives, root acts as a user whom the modes of files hold back.
+class HeldBackByModes {
+ public:
+  HeldBackByModes() {
+    if (user_ == 0 && seteuid(65534) != 0) throw std::runtime_error("cannot become another user");
+  }
+  ~HeldBackByModes() { EXPECT_EQ(seteuid(user_), 0); }
+  HeldBackByModes(const HeldBackByModes&) = delete;
+  HeldBackByModes& operator=(const HeldBackByModes&) = delete;
+
+ private:
+  const uid_t user_ = geteuid();
+};
 
 class LintTest : public ::testing::Test {
  protected:

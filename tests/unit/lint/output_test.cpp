@@ -82,6 +82,46 @@ TEST(LintOutput, JsonHasAllOfAFinding) {
   EXPECT_EQ(finding["languages"][0], "ger");
 }
 
+TEST(LintOutput, AnnotationOfADirectoryHasNoPlace) {
+  Outcome outcome;
+  outcome.findings.push_back(
+      {"descriptor-missing", Severity::kError, "/p/", {}, "", "there is none", {}});
+  std::ostringstream out;
+  WriteAnnotations(out, outcome);
+  EXPECT_EQ(out.str(), "::error file=/p/,title=descriptor-missing::there is none\n");
+  const Json::Value json = ToJson(outcome);
+  EXPECT_EQ(json["errors"].asInt(), 1);
+  EXPECT_EQ(json["findings"][0]["line"].asInt(), 0);
+}
+
+TEST(LintOutput, JsonTellsHowEachTextStands) {
+  TextRow row{"app:title", {}, {"ita"}};
+  row.states = {{"enu", TextState::kPresent},    {"ita", TextState::kPresent},
+                {"trk", TextState::kNoLanguage}, {"fre", TextState::kNoSection},
+                {"ger", TextState::kNoKey},      {"jpn", TextState::kEmpty}};
+  Outcome outcome;
+  outcome.tables.push_back({"/p/index.conf", "/p/texts/", {row}});
+  const Json::Value table = ToJson(outcome)["texts"][0];
+  EXPECT_EQ(table["file"], "/p/index.conf");
+  EXPECT_EQ(table["root"], "/p/texts/");
+  const Json::Value& states = table["references"]["app:title"];
+  EXPECT_EQ(states["enu"], "present");
+  EXPECT_EQ(states["ita"], "untranslated");
+  EXPECT_EQ(states["trk"], "no-language");
+  EXPECT_EQ(states["fre"], "no-section");
+  EXPECT_EQ(states["ger"], "missing");
+  EXPECT_EQ(states["jpn"], "empty");
+}
+
+TEST(LintOutput, JsonOfATagHasWhatExplainShows) {
+  const Json::Value json = ToJson(*FindTag("description-missing"));
+  EXPECT_EQ(json["tag"], "description-missing");
+  EXPECT_EQ(json["severity"], SeverityName(FindTag("description-missing")->severity));
+  EXPECT_FALSE(json["schema"].asBool());
+  EXPECT_NE(json["summary"], "");
+  EXPECT_NE(json["explanation"], "");
+}
+
 TEST_F(LintTest, TableShowsEachGapInEightyColumns) {
   WriteTexts("ger", "[app]\ntitle=\"T\"\ndesc=\"\"\n");
   WriteTexts("ita", GoodTexts("enu"));

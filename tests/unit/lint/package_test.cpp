@@ -1,13 +1,16 @@
 // Which packages a path names, and that their files are found as the library finds them.
 #include <gmock/gmock.h>
 #include <gtest/gtest.h>
+#include <sys/stat.h>
 #include <unistd.h>
 
 #include <stdexcept>
+#include <string>
+#include <vector>
 
 #include "appindex/index_mgr_internal.h"
 #include "appindex/string_pool_internal.h"
-#include "tests/unit/host/temp_dir.h"
+#include "tests/unit/lint/lint_test.h"
 #include "tool/lint/package.h"
 
 namespace tool::lint {
@@ -71,6 +74,88 @@ TEST(Package, DescriptorElsewhereBelongsToTheNearestDirectoryWithTexts) {
   EXPECT_FALSE(said[0].is_guessed);
 }
 
+TEST(Package, FilesAmongInstalledPackagesAreNone) {
+  const TempDir dir;
+  dir.Write("var/packages/readme", "");
+  const std::string file = dir.Write("var/packages/index.conf", "{}");
+  dir.Write("var/packages/One/index.conf", "{}");
+  ASSERT_EQ(FindPackages(dir / "var/packages", "").size(), 1U);
+  const auto packages = FindPackages(file, "");  // named outright it is looked at all the same
+  ASSERT_EQ(packages.size(), 1U);
+  EXPECT_TRUE(packages[0].is_guessed);
+  EXPECT_EQ(packages[0].dir, dir / "var/packages/");
+}
+
+TEST(Package, InstalledPackageWhoseDescriptorLiesTooDeepIsToldOf) {
+  const TempDir dir;
+  const std::string deep = dir.Write("var/packages/Deep/1/2/3/4/5/6/index.conf", "{}");
+  const auto packages = FindPackages(dir.Path(), "");
+  ASSERT_EQ(packages.size(), 1U);
+  EXPECT_THAT(packages[0].checked, IsEmpty());
+  EXPECT_THAT(packages[0].deep_descriptors, ElementsAre(deep));
+}
+
+TEST(Package, PartOfAPackageMeansTheDescriptorsInIt) {
+  const TempDir dir;
+  const std::string one = dir.Write("var/packages/One/a/index.conf", "{}");
+  const std::string two = dir.Write("var/packages/One/b/index.conf", "{}");
+  dir.Write("var/packages/One/c/readme", "");
+  EXPECT_THAT(FindPackages(dir / "var/packages/One/a/", "")[0].checked, ElementsAre(one));
+  EXPECT_THAT(FindPackages(dir / "var/packages/One/c", "")[0].checked, ElementsAre(one, two));
+}
+
+TEST(Package, BuiltInModuleOfADeviceWithoutTextsHasNone) {
+  const TempDir dir;
+  const std::string conf = dir.Write("usr/tovo/tovoman/webman/modules/M/index.conf", "{}");
+  const auto packages = FindPackages(conf, "");
+  ASSERT_EQ(packages.size(), 1U);
+  EXPECT_TRUE(packages[0].is_built_in);
+  EXPECT_EQ(packages[0].texts, "");
+}
+
+TEST(Package, FileNamedTextsIsNoDirectoryOfTexts) {
+  const TempDir dir;
+  dir.Write("a/texts", "");
+  dir.Write("index.conf", "{}");
+  EXPECT_EQ(FindPackages(dir.Path(), "")[0].texts, "");
+  dir.Write("b/texts/enu/strings", "");
+  EXPECT_EQ(FindPackages(dir.Path(), "")[0].texts, dir / "b/texts/");
+}
+
+TEST(Package, NothingIsLookedForFarBeyondTheReach) {
+  const TempDir dir;
+  std::string path;
+  for (int level = 0; level < 30; ++level) path += "d/";
+  dir.Write(path + "index.conf", "{}");
+  const Package package = FindPackages(dir.Path(), "")[0];
+  EXPECT_THAT(package.descriptors, IsEmpty());
+  EXPECT_THAT(package.deep_descriptors, IsEmpty());
+}
+
+TEST(Package, DirectoryThatMayNotBeOpenedIsNamedWithTheCause) {
+  const TempDir dir;
+  for (const char* name : {"closed/file", "device/var/packages/file"}) dir.Write(name, "");
+  ASSERT_EQ(chmod((dir / "closed").c_str(), 0), 0);
+  ASSERT_EQ(chmod((dir / "device/var/packages").c_str(), 0), 0);
+  ASSERT_EQ(chmod(dir.Path().c_str(), 0755), 0);
+  std::vector<std::string> refusals;
+  {
+    const HeldBackByModes user;
+    for (const char* name : {"closed", "device"}) {
+      try {
+        FindPackages(dir / name, "");
+      } catch (const std::runtime_error& error) {
+        refusals.emplace_back(error.what());
+      }
+    }
+  }
+  chmod((dir / "closed").c_str(), 0755);
+  chmod((dir / "device/var/packages").c_str(), 0755);
+  EXPECT_THAT(refusals,
+              ElementsAre(::testing::HasSubstr("/closed: Permission denied; "),
+                          ::testing::HasSubstr("/device/var/packages/: Permission denied; ")));
+}
+
 TEST(Package, FilesAreFoundAsTheLibraryFindsThem) {
   const TempDir dir;
   for (const char* name : {"1", "1/2", "1/2/3/4/5", "a/b", "1/2/3/4/5/6"}) {
@@ -124,6 +209,8 @@ TEST(Package, PathsAreShownFromTheCurrentDirectory) {
   EXPECT_EQ(DisplayPath(dir.Path() + "/"), ".");
   EXPECT_EQ(DisplayPath(dir.Path() + "x/file"), dir.Path() + "x/file");
   EXPECT_EQ(FindPackages(".", "")[0].dir, dir.Path() + "/");
+  ASSERT_EQ(chdir("/"), 0);
+  EXPECT_EQ(DisplayPath("/a/file"), "/a/file");
 }
 
 }  // namespace

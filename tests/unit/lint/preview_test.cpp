@@ -3,6 +3,7 @@
 
 #include <gmock/gmock.h>
 #include <gtest/gtest.h>
+#include <unistd.h>
 
 #include "tests/unit/host/temp_dir.h"
 #include "tool/failure.h"
@@ -100,10 +101,34 @@ TEST_F(PreviewTest, ModuleThatTheLibraryDropsIsSaid) {
   EXPECT_EQ(preview.records.size(), 1U);
 }
 
+TEST_F(PreviewTest, WhatIsNoListOfModulesIsSaid) {
+  const Preview preview = Make(R"({"app": "A", "title": "t", "modules": 5})");
+  ASSERT_EQ(preview.left_out.size(), 1U);
+  EXPECT_EQ(preview.left_out[0].pointer, "/modules");
+  EXPECT_EQ(preview.left_out[0].filter, "type");
+  EXPECT_EQ(preview.left_out[0].reason, "gives nothing: not a list");
+  EXPECT_EQ(preview.records.size(), 1U);
+}
+
+TEST_F(PreviewTest, DescriptorThatCannotBeReadIsNamedWithTheCause) {
+  const std::string file = dir_.Write("target/ui/index.conf", "{}");
+  const lint::Package package = lint::FindPackages(dir_.Path(), "")[0];
+  ASSERT_EQ(truncate(file.c_str(), 20 * 1024 * 1024), 0);
+  try {
+    MakePreview(package, file, options_);
+    FAIL() << "it was read";
+  } catch (const Failure& failure) {
+    EXPECT_THAT(failure.what(),
+                HasSubstr("target/ui/index.conf: cannot be read: longer than 16 MiB; make it "));
+  }
+}
+
 TEST_F(PreviewTest, FailuresNameTheFileAndTheCause) {
   EXPECT_THAT(LineOf("{\n,}"), HasSubstr("target/ui/index.conf:2:1: "));
   EXPECT_THAT(LineOf(R"({"app": 7, "title": "t"})"), HasSubstr("adding it would fail"));
   EXPECT_THAT(LineOf(R"({"app": "A", "title": []})"), HasSubstr("adding it would fail"));
+  EXPECT_THAT(LineOf(R"({"app": "A", "title": "a\u0000b"})"),
+              HasSubstr("adding it would fail: the search daemon does not take the document"));
 }
 
 }  // namespace

@@ -108,6 +108,11 @@ TEST(SourceText, ErrorsHaveAPlaceAndAPlainMessage) {
       {std::string("[\n\0]", 4), 2, 1, "NUL"},
       {"[\n" + Nested(200) + "]", 2, 200, "too deeply"},
       {"[\"" + std::string(300, '[') + "\", " + Nested(200) + "]", 1, 505, "too deeply"},
+      {"[\"\\\"[[[\", [[]], {\"a\": {}}, " + Nested(200) + "]", 1, 227, "too deeply"},
+      {"]", 1, 1, "value, object or array expected"},
+      {"[1 ]]", 1, 5, "Extra non-whitespace"},
+      {"[1 }]", 1, 4, "Missing ',' or ']'"},
+      {"\xEF\xBB\xBF{} x", 1, 1, "byte order mark"},
   };
   for (const Case& c : cases) {
     const SourceText source(c.text);
@@ -133,6 +138,14 @@ TEST(SourceText, PlacesCountLinesAndCharacters) {
   EXPECT_EQ(at(7), "3:1");
   EXPECT_EQ(at(10), "5:1");
   EXPECT_EQ(at(999), "5:2");
+}
+
+TEST(SourceText, LineEndAtTheEndOfTheTextBeginsALine) {
+  for (const char* text : {"a\n", "a\r", "a\r\n"}) {
+    const SourceText source(text);
+    EXPECT_EQ(source.At(99).line, 2U);
+    EXPECT_EQ(source.At(99).column, 1U);
+  }
 }
 
 TEST(SourceText, FirstWrongByteIsFound) {

@@ -1,5 +1,10 @@
 // The findings about translated texts.
+#include <sys/stat.h>
+
 #include <algorithm>
+#include <filesystem>
+#include <string>
+#include <vector>
 
 #include "tests/unit/lint/lint_test.h"
 
@@ -123,6 +128,36 @@ TEST_F(LintTest, TextsNotFoundInThePackage) {
   EXPECT_THAT(FindIn(dir_ / "other"), ElementsAre(Is("texts-not-found", "")));
   dir_.Write("other/index.conf", R"({"app": "A", "title": "Literal", "desc": "d"})");
   EXPECT_THAT(FindIn(dir_ / "other"), IsEmpty());
+}
+
+TEST_F(LintTest, TextsNotFoundForABuiltInModule) {
+  const std::string conf = dir_.Write("usr/tovo/tovoman/webman/modules/M/index.conf",
+                                      R"({"app": "A", "title": "app:title", "desc": "d"})");
+  const auto found = FindIn(conf);
+  ASSERT_THAT(found, ElementsAre(Is("texts-not-found", "")));
+  EXPECT_THAT(found[0].message, HasSubstr("web interface's texts are not there"));
+}
+
+TEST_F(LintTest, TextsNotFoundBecauseADirectoryCannotBeOpened) {
+  dir_.Write("shut/index.conf", R"({"app": "A", "title": "app:title", "desc": "d"})");
+  for (const char* name : {"a", "b"}) {
+    dir_.Write(std::string("shut/") + name + "/texts/enu/strings", GoodTexts("enu"));
+  }
+  // The one that is met first; the texts in the other one are there, but are not reached.
+  std::filesystem::path first = *std::filesystem::directory_iterator(dir_ / "shut");
+  if (!std::filesystem::is_directory(first)) {
+    first = *++std::filesystem::directory_iterator(dir_ / "shut");
+  }
+  ASSERT_EQ(chmod(first.c_str(), 0), 0);
+  ASSERT_EQ(chmod(dir_.Path().c_str(), 0755), 0);
+  std::vector<Finding> found;
+  {
+    const HeldBackByModes user;
+    found = FindIn(dir_ / "shut");
+  }
+  chmod(first.c_str(), 0755);
+  ASSERT_THAT(found, ElementsAre(Is("texts-not-found", "")));
+  EXPECT_THAT(found[0].message, HasSubstr("cannot be opened, which ends the search for texts"));
 }
 
 TEST_F(LintTest, TextsNotFoundBesideTheDescriptor) {

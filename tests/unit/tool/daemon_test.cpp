@@ -2,6 +2,7 @@
 #include "tool/daemon.h"
 
 #include <gmock/gmock.h>
+#include <sys/stat.h>
 #include <unistd.h>
 
 #include <csignal>
@@ -48,6 +49,18 @@ TEST_F(AskDaemonTest, DaemonThatIsNotThereIsNamed) {
   EXPECT_EQ(failure.code(), 913);
 }
 
+TEST_F(AskDaemonTest, OtherUsersAreToldToBecomeRootWhereTheSocketIsNotTheirs) {
+  if (!test::IsTrueRoot()) GTEST_SKIP() << "needs root: becomes another user";
+  const test::ScriptedDaemon daemon;
+  ASSERT_EQ(chmod(test::kSocket, 0600), 0);
+  ASSERT_EQ(seteuid(65534), 0);
+  const Failure failure = FailureOf();
+  ASSERT_EQ(seteuid(0), 0);
+  EXPECT_THAT(failure.what(), AllOf(HasSubstr("does not answer: Permission denied"),
+                                    EndsWith("; run appindex as root")));
+  EXPECT_EQ(failure.exit_code(), kDaemonUnreachable);
+}
+
 TEST_F(AskDaemonTest, DaemonThatAcceptsAndSaysNothingIsLeftAfterAWhile) {
   std::promise<void> asked;
   const test::ScriptedDaemon daemon([&](const Json::Value&) {
@@ -71,15 +84,17 @@ TEST_F(AskDaemonTest, TheWaitIsOverWithTheAnswer) {
 }
 
 TEST_F(AskDaemonTest, OtherEndsOfTheExchangeAreTold) {
-  const test::ScriptedDaemon daemon({{test::Reaction::kHangUp, ""},
-                                     test::Reply("nonsense"),
-                                     test::Reply("[]"),
-                                     test::Reply(R"({"success":1})"),
-                                     test::Reply(R"({"success":false})"),
-                                     test::Reply(R"({"success":false,"error":[]})"),
-                                     test::Reply(R"({"success":false,"error":{"code":"601"}})")});
+  const test::ScriptedDaemon daemon(
+      {{test::Reaction::kHangUp, ""},
+       test::Reply("nonsense"),
+       test::Reply("[]"),
+       test::Reply(R"({"success":1})"),
+       test::Reply(R"({"success":false})"),
+       test::Reply(R"({"success":false,"error":[]})"),
+       test::Reply(R"({"success":false,"error":{"code":"601"}})"),
+       test::Reply(R"({"success":false,"error":{"code":601,"msg":5}})")});
   EXPECT_THAT(FailureOf().what(), HasSubstr("closed the connection without an answer; "));
-  for (int reply = 1; reply < 7; ++reply) {
+  for (int reply = 1; reply < 8; ++reply) {
     const Failure failure = FailureOf();
     EXPECT_THAT(failure.what(), HasSubstr("an answer that makes no sense; "));
     EXPECT_EQ(failure.exit_code(), kDaemonUnreachable);

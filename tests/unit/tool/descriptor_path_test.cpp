@@ -80,6 +80,15 @@ TEST_F(DescriptorPathTest, OthersAreRefusedWithTheReason) {
   expect_refusal("/var/packages/Empty", "there is no index.conf in it", "; name a descriptor");
 }
 
+TEST_F(DescriptorPathTest, RootIsSearchedAsAnyDirectory) {
+  EXPECT_EQ(Refusal("/"),
+            "/: there is no index.conf in it, nor up to five levels below; name a descriptor, or a "
+            "directory that holds one");
+  const std::string conf = test::Install("App");
+  EXPECT_EQ(Refusal("/"), "found " + conf);
+  EXPECT_EQ(Refusal("/var/.."), "found " + conf);
+}
+
 TEST_F(DescriptorPathTest, WhatIsNotThereIsNamedAsSuch) {
   ASSERT_EQ(symlink("/volume9/App", "/var/packages/Dangling"), 0);
   for (const std::string path :

@@ -27,6 +27,11 @@ TEST(Emphasised, BeginningsOfWords) {
   EXPECT_EQ(Marked("Photo Album", "pho al"), "[Pho]to [Al]bum");
 }
 
+TEST(Emphasised, WhiteSpaceOfAnyAmountPartsTheWords) {
+  EXPECT_EQ(Marked("Photo Album", "  pho \t\u3000 al "), "[Pho]to [Al]bum");
+  EXPECT_EQ(Marked("Photo Album", " "), "Photo Album");
+}
+
 TEST(Emphasised, InsideWordsOnlyWhereNoneBeginsSo) {
   EXPECT_EQ(Marked("Fotoalbum", "album"), "Foto[album]");
   EXPECT_EQ(Marked("Album, Fotoalbum", "album"), "[Album], Fotoalbum");
@@ -57,6 +62,8 @@ TEST(Emphasised, OtherFormsOfAWordWhereTheyWereFound) {
   EXPECT_EQ(Marked("Alte Häuser", "haus", Likeness::kForm), "Alte [Häus]er") << "it is there";
   EXPECT_EQ(Marked("Altes Haus", "häuser", Likeness::kForm), "Altes [Haus]");
   EXPECT_EQ(Marked("Mail Server", "photos", Likeness::kForm), "Mail Server");
+  EXPECT_EQ(Marked("Photography", "phosphor", Likeness::kForm), "Photography")
+      << "less than half of the word";
 }
 
 TEST(Emphasised, WordsThatAreMeantBySlips) {

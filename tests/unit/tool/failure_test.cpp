@@ -4,6 +4,7 @@
 #include <gmock/gmock.h>
 #include <unistd.h>
 
+#include <iostream>
 #include <string>
 #include <utility>
 #include <vector>
@@ -103,6 +104,10 @@ INSTANTIATE_TEST_SUITE_P(
             "/no/lock: the lock file cannot be opened: No such file or directory; see whether .*"},
         Row{506, "open failed, path=/tmp/lock, reason=Success",
             "/tmp/lock: the lock file cannot be opened; try again later"},
+        Row{506, "open failed, path=/etc/passwd, reason=Success",
+            "/etc/passwd: the lock file cannot be opened; try again later"},
+        Row{506, "open failed, path=/etc/passwd/lock, reason=Success",
+            "/etc/passwd/lock: the lock file cannot be opened: Not a directory; see whether .*"},
         Row{506, "No locks available",
             "a lock cannot be taken: No locks available; try again later"},
         Row{801, "", "the user Velkor, .* cannot be looked up; add it to the user database"},
@@ -178,6 +183,26 @@ TEST(Explain, OwnFailuresAreCauseAndAdvice) {
   EXPECT_EQ(report.cause, "/a: gone");
   EXPECT_EQ(report.exit_code, kNothingFound);
   EXPECT_EQ(report.code, 120);
+}
+
+TEST(ReportFailure, IsJsonTooWithACodeWhereThereIsOne) {
+  Context context;
+  context.json = true;
+  const auto written = [&](int code) {
+    testing::internal::CaptureStderr();
+    testing::internal::CaptureStdout();
+    ReportFailure(context, Failure("/a: gone", "bring it back", kFailed, code));
+    std::cout.flush();
+    return testing::internal::GetCapturedStderr() + testing::internal::GetCapturedStdout();
+  };
+  EXPECT_EQ(written(0),
+            "appindex: /a: gone; bring it back\n"
+            R"({"error":{"message":"/a: gone; bring it back"}})"
+            "\n");
+  EXPECT_EQ(written(120),
+            "appindex: /a: gone; bring it back (code 120)\n"
+            R"({"error":{"code":120,"message":"/a: gone; bring it back"}})"
+            "\n");
 }
 
 TEST(ReportFailure, IsOneLineWhateverThePathHolds) {

@@ -14,9 +14,12 @@
 #include <cstring>
 #include <fstream>
 #include <iterator>
+#include <sstream>
 #include <string>
 
 #include "common/unique_fd.h"
+#include "tests/support/device_root_test.h"
+#include "tests/unit/host/temp_dir.h"
 
 namespace tool {
 namespace {
@@ -131,6 +134,60 @@ TEST_F(HeldByAnHeir, WithoutOneToBeSeenTheTakerIsSaidToHaveEnded) {
   ASSERT_EQ(holders.size(), 1U);
   EXPECT_EQ(holders[0].pid, taker_);
   EXPECT_TRUE(holders[0].has_ended);
+}
+
+MATCHER_P3(IsHolder, pid, program, has_ended, "") {
+  return arg.pid == pid && arg.program == program && arg.has_ended == has_ended;
+}
+
+// A /proc as the kernel shows it to others than root, and in the moment in which a process ends.
+class MadeUpProc : public ::testing::Test {
+ protected:
+  MadeUpProc() {
+    dir_.Write("lock", "");
+    stat(Lock().c_str(), &file_);
+  }
+
+  std::string Lock() const { return dir_ / "lock"; }
+
+  // The line of a process that has taken the lock.
+  std::string Line(pid_t pid) const {
+    std::ostringstream line;
+    line << "1: FLOCK  ADVISORY  WRITE " << pid << " " << std::hex << major(file_.st_dev) << ":"
+         << minor(file_.st_dev) << ":" << std::dec << file_.st_ino << " 0 EOF\n";
+    return line.str();
+  }
+
+  std::vector<LockHolder> Holders(const std::string& locks) {
+    dir_.Write("proc/locks", locks);
+    const velkor::UniqueFd proc(open((dir_ / "proc").c_str(), O_RDONLY | O_DIRECTORY | O_CLOEXEC));
+    return LockHolders(proc.Get(), Lock());
+  }
+
+  TempDir dir_;
+  struct stat file_ {};
+};
+
+TEST_F(MadeUpProc, TheTakerIsNamedThatDoesNotShowItsFiles) {
+  dir_.Write("proc/12/comm", "package-manager\n");
+  dir_.Write("proc/12/fd", "");  // is no directory that may be read
+  EXPECT_THAT(Holders(Line(12)), ElementsAre(IsHolder(12, "package-manager", false)));
+}
+
+TEST_F(MadeUpProc, OthersThatDoNotShowTheirFilesAreNotTakenForHolders) {
+  dir_.Write("proc/13/fd", "");
+  EXPECT_THAT(Holders(Line(12)), ElementsAre(IsHolder(12, "", true)));
+}
+
+TEST_F(MadeUpProc, ProcessThatEndsMeanwhileHasNoName) {
+  test::MakeDirs(dir_ / "proc/12/fd");
+  ASSERT_EQ(symlink(Lock().c_str(), (dir_ / "proc/12/fd/3").c_str()), 0);
+  EXPECT_THAT(Holders(Line(12)), ElementsAre(IsHolder(12, "", false)));
+}
+
+TEST_F(MadeUpProc, LinesOfAnotherFormNameNobody) {
+  EXPECT_THAT(Holders("1: FLOCK  ADVISORY  WRITE 12 here 0 EOF\n"), IsEmpty());
+  EXPECT_THAT(Holders("1: FLOCK  ADVISORY  WRITE nobody 08:01:77 0 EOF\n"), IsEmpty());
 }
 
 TEST(LockHolders, WithoutFileOrListThereAreNone) {

@@ -45,6 +45,24 @@ TEST(Output, CountedTakesThePlural) {
   EXPECT_EQ(Counted(2, "request"), "2 requests");
 }
 
+TEST(Output, RemarksAreOneLineAndNoneWithQuiet) {
+  Context context;
+  testing::internal::CaptureStderr();
+  Remark(context, "a\nb");
+  context.quiet = true;
+  Remark(context, "c");
+  EXPECT_EQ(testing::internal::GetCapturedStderr(), "a b\n");
+}
+
+TEST(Output, FileIsNoTerminalAndHasTheUsualWidth) {
+  unsetenv("TERM");
+  unsetenv("NO_COLOR");
+  constexpr int kNoFile = -1;
+  EXPECT_FALSE(IsTerminal(kNoFile));
+  EXPECT_FALSE(MayEmphasise(kNoFile));
+  EXPECT_EQ(TerminalWidth(kNoFile), 80);
+}
+
 TEST(Output, StyledIsPlainWhereItMayNotEmphasise) {
   EXPECT_EQ(Styled("text", Look::kBold, false), "text");
   EXPECT_EQ(Styled("text", Look::kPlain, true), "text");

@@ -101,6 +101,61 @@ TEST(ProgressLine, CountsOverAllRequests) {
   EXPECT_EQ(line.requests(), 2U);
 }
 
+// What a visible line writes to standard error while `work` is done.
+template <typename Work>
+std::string Written(const Work& work) {
+  testing::internal::CaptureStderr();
+  {
+    ProgressLine line(true);
+    work(line);
+  }
+  return testing::internal::GetCapturedStderr();
+}
+
+TEST(ProgressLine, SaysWhatItWaitsForAndWhenALongWaitEnds) {
+  using std::chrono::seconds;
+  using Wait = velkor::appindex::Observer::Wait;
+  const auto waiting = [](Wait reason, seconds pause) {
+    return Written([&](ProgressLine& line) { line.OnWait(reason, pause); });
+  };
+  EXPECT_THAT(waiting(Wait::kLock, seconds(0)), HasSubstr("another process that works the queue"));
+  EXPECT_THAT(waiting(Wait::kSocket, seconds(1)),
+              testing::AllOf(HasSubstr("waiting for the search daemon to start"),
+                             Not(HasSubstr("next try"))));
+  EXPECT_THAT(waiting(Wait::kNotReady, seconds(30)),
+              testing::ContainsRegex("the search daemon's database; next try at [0-9:]+"));
+  EXPECT_THAT(waiting(Wait::kBusy, seconds(900)),
+              testing::ContainsRegex("the search daemon is busy; next try at [0-9:]+"));
+}
+
+TEST(ProgressLine, EndsTheWaitWithTheNextDocument) {
+  const std::string written = Written([](ProgressLine& line) {
+    line.OnWork(1);
+    line.OnWait(velkor::appindex::Observer::Wait::kSocket, std::chrono::seconds(1));
+    line.OnDocument("/var/packages/A/index.conf", "enu");
+  });
+  EXPECT_THAT(written.substr(written.rfind("100%")), Not(HasSubstr("waiting")));
+}
+
+TEST(ProgressLine, NamesAPathThatIsNoApplicationsAsItIs) {
+  EXPECT_THAT(Written([](ProgressLine& line) {
+                line.OnWork(1);
+                line.OnDocument("/data/index.conf", "enu");
+              }),
+              HasSubstr("/data/index.conf enu"));
+}
+
+TEST(ProgressLine, WritesNothingUnlessItIsVisible) {
+  testing::internal::CaptureStderr();
+  {
+    ProgressLine line(false);
+    line.OnWork(1);
+    line.OnWait(velkor::appindex::Observer::Wait::kBusy, std::chrono::seconds(900));
+    line.OnDocument("/var/packages/A/index.conf", "enu");
+  }
+  EXPECT_EQ(testing::internal::GetCapturedStderr(), "");
+}
+
 TEST(ProgressLine, TakesMoreDocumentsThanWereCounted) {
   ProgressLine line(false);
   line.OnWork(0);

@@ -4,10 +4,12 @@
 #include <gmock/gmock.h>
 #include <utime.h>
 
+#include <cerrno>
 #include <ctime>
 
 #include "tests/support/device_root_test.h"
 #include "tests/support/indexing.h"
+#include "tests/unit/tool/recorded_calls.h"
 
 namespace tool {
 namespace {
@@ -53,6 +55,27 @@ TEST_F(QueueStateTest, UnreadableFileIsNotAMissingOne) {
   const RequestFile file = ReadRequestFile(kQueue);
   EXPECT_EQ(file.state, RequestFile::kUnreadable);
   EXPECT_EQ(file.cause, "Is a directory");
+}
+
+// The queue's worker moves it, and is done with it, at any moment.
+TEST_F(QueueStateTest, FileThatIsGoneBeforeItsRequestsAreReadIsAMissingOne) {
+  test::WriteFile(kQueue, Request(1, "/b") + "\n");
+  const test::FailingCall open("open", ENOENT, 1);
+  const RequestFile file = ReadRequestFile(kQueue);
+  EXPECT_TRUE(open.HasFailed());
+  EXPECT_EQ(file.state, RequestFile::kMissing);
+  EXPECT_EQ(file.path, kQueue);
+  EXPECT_EQ(file.lines, 0U);
+  EXPECT_THAT(TakeLog(), IsEmpty());
+}
+
+TEST_F(QueueStateTest, FileThatIsGoneBeforeItsTimeIsReadIsNew) {
+  test::WriteFile(kQueue, Request(1, "/b") + "\n");
+  const utimbuf hour_ago = {0, std::time(nullptr) - 3600};
+  ASSERT_EQ(utime(kQueue, &hour_ago), 0);
+  const test::FailingCall stat("stat", ENOENT, 1);
+  EXPECT_EQ(ReadRequestFile(kQueue).age, 0);
+  EXPECT_TRUE(stat.HasFailed());
 }
 
 TEST_F(QueueStateTest, OrderIsBatchThenQueueEachByPath) {

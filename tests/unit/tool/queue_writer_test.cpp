@@ -9,10 +9,12 @@
 #include <sys/wait.h>
 #include <unistd.h>
 
+#include <cerrno>
 #include <csignal>
 #include <cstring>
 #include <string>
 #include <thread>
+#include <utility>
 #include <vector>
 
 #include "common/unique_fd.h"
@@ -25,6 +27,7 @@
 namespace tool {
 namespace {
 
+using test::FailingCall;
 using test::kBatch;
 using test::kQueue;
 using test::ReadFile;
@@ -88,7 +91,9 @@ bool IsWaitedFor(int proc, pid_t waiter) {
          std::string::npos;
 }
 
-TEST_F(QueueWriterTest, WaitingWriterTakesTheQueueThatIsThereWhenItWakes) {
+class WaitingQueueWriter : public QueueWriterTest, public testing::WithParamInterface<bool> {};
+
+TEST_P(WaitingQueueWriter, TakesTheQueueThatIsThereWhenItWakes) {
   const velkor::UniqueFd proc(openat(OutsideRootFd(), "proc", O_RDONLY | O_DIRECTORY | O_CLOEXEC));
   const int held = open(kQueue, O_RDWR | O_CREAT | O_CLOEXEC, 0644);
   ASSERT_EQ(flock(held, LOCK_EX), 0);
@@ -101,13 +106,19 @@ TEST_F(QueueWriterTest, WaitingWriterTakesTheQueueThatIsThereWhenItWakes) {
   while (!IsWaitedFor(proc.Get(), writer)) std::this_thread::yield();
   // As the worker of the queue does, under the lock that the writer waits for.
   ASSERT_EQ(rename(kQueue, kBatch), 0);
+  if (GetParam()) test::WriteFile(kQueue, kRebuild);  // a third process was faster
   close(held);
   int status = -1;
   ASSERT_EQ(waitpid(writer, &status, 0), writer);
   EXPECT_EQ(status, 0);
   EXPECT_EQ(ReadFile(kBatch), "");
-  EXPECT_EQ(ReadFile(kQueue), kRebuild);
+  EXPECT_EQ(ReadFile(kQueue), std::string(GetParam() ? kRebuild : "") + kRebuild);
 }
+
+INSTANTIATE_TEST_SUITE_P(AfterTheQueueWasTaken, WaitingQueueWriter, testing::Bool(),
+                         [](const auto& param_info) {
+                           return param_info.param ? "AndMadeAnew" : "AndIsGone";
+                         });
 
 TEST_F(QueueWriterTest, FailuresNameTheFileTheCauseAndWhatToDo) {
   const std::string opening = std::string(kQueue) + ": the queue cannot be opened: ";
@@ -171,6 +182,48 @@ TEST_F(QueueWriterTest, PartOfALineThatStaysIsToldOf) {
   std::vector<std::string> calls;
   const RecordedCalls recorded(calls, {"fsync of a file", "ftruncate"});
   EXPECT_THAT(Refusal(), HasSubstr("a part of a line could not be taken back"));
+}
+
+TEST_F(QueueWriterTest, InterruptionDoesNotEndTheWaitForTheLock) {
+  const FailingCall lock("flock", EINTR);
+  EXPECT_EQ(Refusal(), "written");
+  EXPECT_TRUE(lock.HasFailed());
+  EXPECT_EQ(ReadFile(kQueue), kRebuild);
+}
+
+TEST_F(QueueWriterTest, LockThatCannotBeTakenIsToldAndNothingIsWritten) {
+  const FailingCall lock("flock", ENOLCK);
+  EXPECT_EQ(Refusal(), std::string(kQueue) +
+                           ": the queue cannot be locked: No locks available; try again later");
+  EXPECT_EQ(ReadFile(kQueue), "");
+}
+
+// It might be another file by now, which the one that works the queue does not read.
+TEST_F(QueueWriterTest, QueueThatCannotBeLookedAtIsNotWritten) {
+  const std::string refusal =
+      std::string(kQueue) + ": the queue cannot be looked at: Input/output error; see to the disk";
+  for (const auto& [name, spared] :
+       {std::pair("fstat", 0), std::pair("lstat", 0), std::pair("fstat", 1)}) {
+    const FailingCall look(name, EIO, spared);
+    EXPECT_EQ(Refusal(), refusal) << name << " after " << spared;
+    EXPECT_EQ(ReadFile(kQueue), "");
+  }
+}
+
+TEST_F(QueueWriterTest, EndThatCannotBeReadCountsAsAnUnfinishedLine) {
+  test::WriteFile(kQueue, kRebuild);
+  const FailingCall end("pread", EIO);
+  AppendToQueue({QueueRequest(3, "")});
+  EXPECT_TRUE(end.HasFailed());
+  EXPECT_EQ(ReadFile(kQueue), std::string(kRebuild) + "\n" + kRebuild);
+}
+
+TEST_F(QueueWriterTest, DirectoryThatCannotBeOpenedToBeSyncedIsToldOf) {
+  const FailingCall directory("open", EMFILE, 1);  // behind the queue itself
+  EXPECT_EQ(Refusal(), std::string(kQueue) +
+                           ": the queue's directory cannot be synced: Too many open files; try "
+                           "again later");
+  EXPECT_EQ(ReadFile(kQueue), kRebuild);
 }
 
 TEST_F(QueueWriterTest, WithoutItsDirectoryItCannotBeMade) {

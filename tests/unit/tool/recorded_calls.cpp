@@ -1,22 +1,28 @@
 #include "tests/unit/tool/recorded_calls.h"
 
+#include <fcntl.h>
+#include <sys/file.h>
 #include <sys/stat.h>
 #include <sys/syscall.h>
 #include <unistd.h>
 
 #include <algorithm>
 #include <cerrno>
+#include <cstdarg>
 #include <utility>
+
+#include "tests/support/open_mode.h"
 
 namespace test {
 namespace {
 
 thread_local std::vector<std::string>* recorded = nullptr;
 thread_local const std::vector<std::string>* failing_calls = nullptr;
+thread_local FailingCall* failing_call = nullptr;
 
 bool IsOf(int fd, mode_t type) {
   struct stat info {};
-  return fstat(fd, &info) == 0 && (info.st_mode & S_IFMT) == type;
+  return fstatat(fd, "", &info, AT_EMPTY_PATH) == 0 && (info.st_mode & S_IFMT) == type;
 }
 
 // Whether the call is to fail.
@@ -41,6 +47,24 @@ RecordedCalls::RecordedCalls(std::vector<std::string>& calls, std::vector<std::s
 
 RecordedCalls::~RecordedCalls() { recorded = nullptr; }
 
+FailingCall::FailingCall(std::string name, int error, int spared)
+    : name_(std::move(name)), error_(error), spared_(spared) {
+  failing_call = this;
+}
+
+FailingCall::~FailingCall() { failing_call = nullptr; }
+
+bool FailingCall::Fails(const std::string& name) {
+  if (name != name_ || HasFailed() || --spared_ >= 0) return false;
+  errno = error_;
+  return true;
+}
+
+namespace {
+
+bool IsFailing(const char* name) { return failing_call != nullptr && failing_call->Fails(name); }
+
+}  // namespace
 }  // namespace test
 
 // Bound to from everywhere in the program, before the C library's.
@@ -67,6 +91,36 @@ VISIBLE int fsync(int fd) {
 VISIBLE int ftruncate(int fd, off_t size) noexcept {
   if (test::recorded != nullptr && test::Fails("ftruncate to " + std::to_string(size))) return -1;
   return static_cast<int>(syscall(SYS_ftruncate, fd, size));
+}
+
+VISIBLE int flock(int fd, int operation) noexcept {
+  return test::IsFailing("flock") ? -1 : static_cast<int>(syscall(SYS_flock, fd, operation));
+}
+
+VISIBLE int stat(const char* path, struct stat* info) noexcept {
+  return test::IsFailing("stat") ? -1 : fstatat(AT_FDCWD, path, info, 0);
+}
+
+VISIBLE int fstat(int fd, struct stat* info) noexcept {
+  return test::IsFailing("fstat") ? -1 : fstatat(fd, "", info, AT_EMPTY_PATH);
+}
+
+VISIBLE int lstat(const char* path, struct stat* info) noexcept {
+  return test::IsFailing("lstat") ? -1 : fstatat(AT_FDCWD, path, info, AT_SYMLINK_NOFOLLOW);
+}
+
+VISIBLE ssize_t pread(int fd, void* data, size_t size, off_t at) {
+  return test::IsFailing("pread") ? -1 : syscall(SYS_pread64, fd, data, size, at);
+}
+
+VISIBLE int open(const char* path, int flags, ...) {
+  va_list arguments;
+  va_start(arguments, flags);
+  const mode_t mode = test::OpenMode(flags, arguments);
+  va_end(arguments);
+  return test::IsFailing("open")
+             ? -1
+             : static_cast<int>(syscall(SYS_openat, AT_FDCWD, path, flags, mode));
 }
 
 }  // extern "C"

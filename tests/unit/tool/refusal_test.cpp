@@ -62,6 +62,17 @@ TEST(Refusals, MessageThatIsTooLongAltogether) {
   EXPECT_EQ(CausesOf(document), " is longer than 16777216 bytes; ");
 }
 
+TEST(Refusals, OfWhatIsNotSentAreNone) {
+  Json::Value document = Document("title", std::string(kMiB, '\x01'));
+  document["desc"] = document["keywords"] = document["title"];
+  document["id"] = 5;
+  EXPECT_EQ(CausesOf(document), "") << "without an id nothing is sent, however long";
+  document = Document("title", "text");
+  document["desc"] = Json::Value(Json::arrayValue);
+  document["desc"].append(std::string(kMiB + 1, 'd'));
+  EXPECT_EQ(CausesOf(document), "");
+}
+
 TEST(RequireTaken, ThrowsWithTheCodeThatAddingEndsIn) {
   RequireTaken("enu", Document("title", "text"));
   try {

@@ -93,6 +93,61 @@ TEST_F(StatusTest, WithoutAFailingRequestNobodyIsBlamed) {
   EXPECT_THAT(Text(), HasSubstr("Left because    not known here, no request of it fails"));
 }
 
+TEST_F(StatusTest, QueueThatCannotBeReadIsToldWithTheCause) {
+  test::MakeDirs(kQueue);
+  const Json::Value queue = Data()["queue"];
+  EXPECT_TRUE(queue["exists"].asBool());
+  EXPECT_EQ(queue["problem"].asString(), "Is a directory");
+  EXPECT_FALSE(queue.isMember("requests"));
+  EXPECT_THAT(Text(), HasSubstr("Queue           cannot be read: Is a directory\n"));
+}
+
+// What is gathered, put together by the test.
+
+TEST(StatusOf, HoldersThatCannotBeSeenAreToldSo) {
+  Status status;
+  status.locks.push_back({"/tmp/lock", {{12, "shell"}, {13, ""}, {14, "", true}}});
+  const Json::Value holders = ToJson(status)["locks"][0]["holders"];
+  EXPECT_FALSE(holders[1].isMember("ended"));
+  EXPECT_TRUE(holders[2]["ended"].asBool());
+  const std::string text = ToText(status);
+  EXPECT_THAT(text, HasSubstr("Locked          /tmp/lock by shell (12)\n"));
+  EXPECT_THAT(text, HasSubstr("Locked          /tmp/lock by process (13)\n"));
+  EXPECT_THAT(text, HasSubstr("Locked          /tmp/lock by a process that cannot be seen; the one "
+                              "that took it\n                has ended (14)\n"));
+}
+
+TEST(StatusOf, BatchThatIsBeingWorkedIsNotSaidToBeLeft) {
+  Status status;
+  status.batch.state = RequestFile::kReadable;
+  EXPECT_THAT(ToText(status), HasSubstr("Left because"));
+  status.locks.push_back({"/var/packages/Velkor/etc/appindex.queue", {{12, "shell"}}});
+  EXPECT_THAT(ToText(status), HasSubstr("Left because")) << "a writer of the queue works no batch";
+  status.locks.push_back({"/tmp/velkor_appindex_process.lck", {{13, "appindex"}}});
+  EXPECT_THAT(ToText(status), Not(HasSubstr("Left because")));
+}
+
+TEST(StatusOf, OneLanguageWithOtherDocumentsIsUneven) {
+  Status status;
+  status.indexes["enu"] = {Index::kWhole, 4, ""};
+  status.indexes["ger"] = {Index::kWhole, 4, ""};
+  EXPECT_TRUE(status.IsEven());
+  status.indexes["ger"].documents = 3;
+  EXPECT_FALSE(ToJson(status)["even"].asBool());
+  EXPECT_THAT(ToText(status), HasSubstr("not as many in each language"));
+}
+
+TEST(StatusOf, UnknownVersionIsNotSaidToDiffer) {
+  Status status;
+  status.version = {"marovanos-7.1", "marovanos-7.2", ""};
+  EXPECT_TRUE(ToJson(status)["version"]["differs"].asBool());
+  status.version.problem = "/etc/os-release: gone";
+  const Json::Value version = ToJson(status)["version"];
+  EXPECT_FALSE(version["differs"].asBool());
+  EXPECT_EQ(version["problem"].asString(), "/etc/os-release: gone");
+  EXPECT_THAT(ToText(status), HasSubstr("System version  not known: /etc/os-release: gone\n"));
+}
+
 TEST_F(StatusTest, NamesCannotForgeLines) {
   test::WriteFile(kBatch, R"({"op":1,"path":"/x\nHeld up by  nobody\u001b[2J/index.conf"})");
   const std::string text = Text();

@@ -30,6 +30,11 @@ TEST(WrapTest, BreaksScriptsWithoutSpacesWhereTheyMayBeBroken) {
   EXPECT_EQ(Wrapped("จัดการรูปภาพ", 6), (Lines{"จัดการ", "รูปภาพ"}));
 }
 
+TEST(WrapTest, CountsFullWidthLettersTwice) {
+  EXPECT_EQ(Wrapped("ＦＴＰｆｔｐ", 6), (Lines{"ＦＴＰ", "ｆｔｐ"}));
+  EXPECT_EQ(Wrapped("ＦＴＰｆｔｐ", 12), Lines{"ＦＴＰｆｔｐ"});
+}
+
 TEST(WrapTest, CountsLettersWithMarksOnce) {
   EXPECT_EQ(Wrapped("e\u0301e\u0301 e\u0301", 4), Lines{"e\u0301e\u0301 e\u0301"});
 }
