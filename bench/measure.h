@@ -1,10 +1,8 @@
-// Measuring and judging a ratio.
+// Measuring time.
 #pragma once
 
-#include <algorithm>
 #include <chrono>
-#include <cstdio>
-#include <vector>
+#include <ctime>
 
 namespace bench {
 
@@ -17,15 +15,18 @@ double SecondsOf(const Work& work) {
   return std::chrono::duration<double>(Clock::now() - start).count();
 }
 
-inline double Median(std::vector<double> values) {
-  std::sort(values.begin(), values.end());
-  return values[values.size() / 2];
+// What this process has taken of the processors until now.
+inline double ProcessorSeconds() {
+  timespec time{};
+  clock_gettime(CLOCK_PROCESS_CPUTIME_ID, &time);
+  return static_cast<double>(time.tv_sec) + static_cast<double>(time.tv_nsec) / 1e9;
 }
 
-// Prints one line and returns the program's exit status: 0 when the ratio keeps to the limit.
-inline int Judge(const char* what, double ratio, double limit) {
-  std::printf("%s: %.3f (limit %.2f)%s\n", what, ratio, limit, ratio <= limit ? "" : "  TOO HIGH");
-  return ratio <= limit ? 0 : 1;
+template <typename Work>
+double ProcessorSecondsOf(const Work& work) {
+  const double start = ProcessorSeconds();
+  work();
+  return ProcessorSeconds() - start;
 }
 
 }  // namespace bench
