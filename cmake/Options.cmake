@@ -12,6 +12,13 @@ target_compile_options(teiseigatro_options INTERFACE
   -Wall -Wextra -Wpedantic -Wshadow -Wconversion
   $<$<BOOL:${TEISEIGATRO_WERROR}>:-Werror>)
 
+# What is built does not depend on the directories that it is built from and in. The later of the two
+# holds, which may lie in the other. What counts coverage looks for the sources by their paths.
+if(NOT TEISEIGATRO_COVERAGE)
+  add_compile_options(-ffile-prefix-map=${PROJECT_SOURCE_DIR}=.
+                      -ffile-prefix-map=${PROJECT_BINARY_DIR}=./build)
+endif()
+
 if(TEISEIGATRO_SANITIZE)
   target_compile_options(teiseigatro_options INTERFACE
     -fsanitize=${TEISEIGATRO_SANITIZE} -fno-sanitize-recover=all -fno-omit-frame-pointer)
