@@ -1,15 +1,12 @@
 // Who may ask the search daemon for what, and clients that are slow, many or broken.
-#include <sys/resource.h>
 #include <sys/socket.h>
 #include <sys/stat.h>
 #include <unistd.h>
 
-#include <filesystem>
 #include <string>
 #include <vector>
 
 #include "host/framing.h"
-#include "tests/support/datagram_socket.h"
 #include "tests/support/searchd_test.h"
 
 namespace test {
@@ -64,25 +61,6 @@ TEST_F(SearchdClients, ServesOthersWhileAClientDoesNotTakeItsReply) {
   std::string reply;
   ASSERT_TRUE(host::RecvFrame(idle[3].Get(), reply));
   EXPECT_EQ(FromText(reply)["total"].asInt(), 20);
-}
-
-TEST_F(SearchdClients, WaitWhileTheDaemonHasNoDescriptorForThem) {
-  std::filesystem::create_directories(root_ / "dev");
-  DatagramSocket log(root_ / "dev/log");
-  constexpr rlim_t kDescriptors = 64;
-  daemon_ = Launch({}, [] {
-    const rlimit limit{kDescriptors, kDescriptors};
-    setrlimit(RLIMIT_NOFILE, &limit);
-  });
-  ASSERT_TRUE(daemon_->IsReady());
-  std::vector<Fd> idle;
-  for (rlim_t i = 0; i < kDescriptors; ++i) idle.push_back(Connect(Socket()));
-  const std::string line = log.ReadUntil("cannot accept a client").back();
-  EXPECT_EQ(line.rfind("<28>", 0), 0U) << "facility daemon, a warning: " << line;
-  EXPECT_NE(line.find("Too many open files"), std::string::npos) << line;
-  idle.clear();
-  Fill("enu");
-  EXPECT_EQ(Find("enu", "file"), "files");
 }
 
 TEST_F(SearchdClients, ForgetsTornRequests) {
