@@ -1,6 +1,5 @@
 #include "tests/crash/steps.h"
 
-#include <dlfcn.h>
 #include <sys/file.h>
 #include <sys/socket.h>
 #include <unistd.h>
@@ -9,6 +8,7 @@
 #include <cstdio>
 
 #include "tests/support/controlled_time.h"
+#include "tests/support/own_calls.h"
 
 namespace test {
 namespace {
@@ -17,11 +17,6 @@ int g_steps_left = 0;  // 0: steps are not counted
 
 void Step() {
   if (g_steps_left > 0 && --g_steps_left == 0) raise(SIGKILL);
-}
-
-template <typename Function>
-Function* Real(const char* name) {
-  return reinterpret_cast<Function*>(dlsym(RTLD_NEXT, name));
 }
 
 }  // namespace

@@ -1,6 +1,5 @@
 // Loaded into a process before every other library, records what it does to files and directories.
 // Every act that changes one, or makes one durable, is recorded right after it, one at a time.
-#include <dlfcn.h>
 #include <fcntl.h>
 #include <sys/stat.h>
 #include <sys/syscall.h>
@@ -18,14 +17,11 @@
 
 #include "tests/reliability/disk_record.h"
 
+#include "tests/support/own_calls.h"
+
 namespace {
 
 using test::DiskRecord;
-
-template <typename Function>
-Function* Real(const char* name) {
-  return reinterpret_cast<Function*>(dlsym(RTLD_NEXT, name));
-}
 
 std::mutex& OneAtATime() {
   static auto* const mutex = new std::mutex;  // for as long as the process makes calls
@@ -101,7 +97,7 @@ void RecordMade(DiskRecord::Kind kind, const Entry& entry, int at, const char* p
 }
 
 int Open(int at, const char* path, int flags, mode_t mode) {
-  static auto* const real = Real<int(int, const char*, int, ...)>("openat64");
+  static auto* const real = test::Real<int(int, const char*, int, ...)>("openat64");
   if ((flags & (O_CREAT | O_TRUNC)) == 0) return real(at, path, flags, mode);
   const std::lock_guard<std::mutex> lock(OneAtATime());
   const Entry entry(at, path);
@@ -117,7 +113,7 @@ int Open(int at, const char* path, int flags, mode_t mode) {
 
 int MakeTemporary(const char* function, char* name, int flags) {
   const std::lock_guard<std::mutex> lock(OneAtATime());
-  const int fd = Real<int(char*, int)>(function)(name, flags);
+  const int fd = test::Real<int(char*, int)>(function)(name, flags);
   if (fd >= 0) RecordMade(DiskRecord::kMakeFile, Entry(AT_FDCWD, name), AT_FDCWD, name);
   return fd;
 }
@@ -136,7 +132,7 @@ ssize_t WriteAt(int fd, const void* data, const Act& act) {
 }
 
 ssize_t WriteAtOffset(int fd, const void* data, size_t size, off_t offset) {
-  static auto* const real = Real<ssize_t(int, const void*, size_t, off_t)>("pwrite64");
+  static auto* const real = test::Real<ssize_t(int, const void*, size_t, off_t)>("pwrite64");
   return WriteAt(fd, data, [&](off_t* at) {
     if (at != nullptr) *at = offset;
     return real(fd, data, size, offset);
@@ -144,7 +140,7 @@ ssize_t WriteAtOffset(int fd, const void* data, size_t size, off_t offset) {
 }
 
 int Truncate(int fd, off_t size) {
-  static auto* const real = Real<int(int, off_t)>("ftruncate64");
+  static auto* const real = test::Real<int(int, off_t)>("ftruncate64");
   const std::lock_guard<std::mutex> lock(OneAtATime());
   const int result = real(fd, size);
   if (result == 0 && IsKept(fd)) {
@@ -162,7 +158,7 @@ int Sync(int (*real)(int), int fd) {
 }
 
 int Rename(int from_at, const char* from, int to_at, const char* to) {
-  static auto* const real = Real<int(int, const char*, int, const char*)>("renameat");
+  static auto* const real = test::Real<int(int, const char*, int, const char*)>("renameat");
   const std::lock_guard<std::mutex> lock(OneAtATime());
   const Entry source(from_at, from);
   const Entry target(to_at, to);
@@ -178,7 +174,7 @@ int Rename(int from_at, const char* from, int to_at, const char* to) {
 }
 
 int Remove(int at, const char* path, int flags) {
-  static auto* const real = Real<int(int, const char*, int)>("unlinkat");
+  static auto* const real = test::Real<int(int, const char*, int)>("unlinkat");
   const std::lock_guard<std::mutex> lock(OneAtATime());
   const Entry entry(at, path);
   const int result = real(at, path, flags);
@@ -189,7 +185,7 @@ int Remove(int at, const char* path, int flags) {
 }
 
 int MakeDirectory(int at, const char* path, mode_t mode) {
-  static auto* const real = Real<int(int, const char*, mode_t)>("mkdirat");
+  static auto* const real = test::Real<int(int, const char*, mode_t)>("mkdirat");
   const std::lock_guard<std::mutex> lock(OneAtATime());
   const Entry entry(at, path);
   const int result = real(at, path, mode);
@@ -243,7 +239,7 @@ VISIBLE int mkostemp(char* name, int flags) { return MakeTemporary("mkostemp", n
 VISIBLE int mkostemp64(char* name, int flags) { return MakeTemporary("mkostemp64", name, flags); }
 
 VISIBLE ssize_t write(int fd, const void* data, size_t size) {
-  static auto* const real = Real<ssize_t(int, const void*, size_t)>("write");
+  static auto* const real = test::Real<ssize_t(int, const void*, size_t)>("write");
   return WriteAt(fd, data, [&](off_t*) { return real(fd, data, size); });
 }
 
@@ -259,12 +255,12 @@ VISIBLE int ftruncate(int fd, off_t size) noexcept { return Truncate(fd, size); 
 VISIBLE int ftruncate64(int fd, off64_t size) noexcept { return Truncate(fd, size); }
 
 VISIBLE int fsync(int fd) {
-  static auto* const real = Real<int(int)>("fsync");
+  static auto* const real = test::Real<int(int)>("fsync");
   return Sync(real, fd);
 }
 
 VISIBLE int fdatasync(int fd) {
-  static auto* const real = Real<int(int)>("fdatasync");
+  static auto* const real = test::Real<int(int)>("fdatasync");
   return Sync(real, fd);
 }
 
@@ -290,7 +286,7 @@ VISIBLE int mkdirat(int at, const char* path, mode_t mode) noexcept {
 }
 
 VISIBLE int chmod(const char* path, mode_t mode) noexcept {
-  static auto* const real = Real<int(const char*, mode_t)>("chmod");
+  static auto* const real = test::Real<int(const char*, mode_t)>("chmod");
   const std::lock_guard<std::mutex> lock(OneAtATime());
   const int result = real(path, mode);
   const Entry entry(AT_FDCWD, path);
@@ -299,7 +295,7 @@ VISIBLE int chmod(const char* path, mode_t mode) noexcept {
 }
 
 VISIBLE int fchmod(int fd, mode_t mode) noexcept {
-  static auto* const real = Real<int(int, mode_t)>("fchmod");
+  static auto* const real = test::Real<int(int, mode_t)>("fchmod");
   const std::lock_guard<std::mutex> lock(OneAtATime());
   const int result = real(fd, mode);
   if (result == 0 && IsKept(fd)) Write({DiskRecord::kMode, 0, 0, StatusOf(fd).st_ino, 0, mode});

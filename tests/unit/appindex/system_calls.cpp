@@ -1,13 +1,14 @@
 #include "system_calls.h"
 
 #include <dirent.h>
-#include <dlfcn.h>
 #include <fcntl.h>
 #include <sys/stat.h>
 #include <unistd.h>
 
 #include <cerrno>
 #include <cstdio>
+
+#include "tests/support/own_calls.h"
 
 namespace test {
 
@@ -23,11 +24,6 @@ bool Fails(SystemCall& call, const char* path) {
   if (call.fails_for != path) return false;
   if (call.error != 0) errno = call.error == kNoErrno ? 0 : call.error;
   return true;
-}
-
-template <typename Function>
-Function* Real(const char* name) {
-  return reinterpret_cast<Function*>(dlsym(RTLD_NEXT, name));
 }
 
 }  // namespace

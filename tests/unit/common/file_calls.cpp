@@ -1,6 +1,5 @@
 #include "file_calls.h"
 
-#include <dlfcn.h>
 #include <fcntl.h>
 #include <sys/file.h>
 #include <sys/stat.h>
@@ -11,7 +10,7 @@
 #include <cstdio>
 #include <utility>
 
-#include "tests/support/open_mode.h"
+#include "tests/support/own_calls.h"
 
 namespace test {
 namespace {
@@ -27,11 +26,6 @@ bool Fails(const char* name, int fd, const char* path = "") {
   errno = result.value_or(kept);
   current_hook = hook;
   return result.has_value();
-}
-
-template <typename Function>
-Function* Real(const char* name) {
-  return reinterpret_cast<Function*>(dlsym(RTLD_NEXT, name));
 }
 
 }  // namespace

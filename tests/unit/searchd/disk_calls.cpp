@@ -1,6 +1,5 @@
 #include "tests/unit/searchd/disk_calls.h"
 
-#include <dlfcn.h>
 #include <sys/stat.h>
 #include <unistd.h>
 
@@ -8,6 +7,8 @@
 #include <csignal>
 #include <cstdio>
 #include <filesystem>
+
+#include "tests/support/own_calls.h"
 
 DiskCalls disk_calls;
 
@@ -18,11 +19,6 @@ DiskCalls::File DiskCalls::FileAt(const std::string& path) {
 }
 
 namespace {
-
-template <typename Function>
-Function* Real(const char* name) {
-  return reinterpret_cast<Function*>(dlsym(RTLD_NEXT, name));
-}
 
 void Step() {
   if (disk_calls.die_at > 0 && --disk_calls.die_at == 0) raise(SIGKILL);
@@ -63,29 +59,29 @@ bool SyncFails(int fd) {
 extern "C" {
 
 VISIBLE ssize_t write(int fd, const void* bytes, size_t size) {
-  static auto* const real = Real<ssize_t(int, const void*, size_t)>("write");
+  static auto* const real = test::Real<ssize_t(int, const void*, size_t)>("write");
   Write(fd);
   return real(fd, bytes, size);
 }
 
 VISIBLE ssize_t pwrite(int fd, const void* bytes, size_t size, off_t at) {
-  static auto* const real = Real<ssize_t(int, const void*, size_t, off_t)>("pwrite");
+  static auto* const real = test::Real<ssize_t(int, const void*, size_t, off_t)>("pwrite");
   Write(fd);
   return real(fd, bytes, size, at);
 }
 
 VISIBLE int fsync(int fd) {
-  static auto* const real = Real<int(int)>("fsync");
+  static auto* const real = test::Real<int(int)>("fsync");
   return SyncFails(fd) ? -1 : real(fd);
 }
 
 VISIBLE int fdatasync(int fd) {
-  static auto* const real = Real<int(int)>("fdatasync");
+  static auto* const real = test::Real<int(int)>("fdatasync");
   return SyncFails(fd) ? -1 : real(fd);
 }
 
 VISIBLE int rename(const char* from, const char* to) noexcept {
-  static auto* const real = Real<int(const char*, const char*)>("rename");
+  static auto* const real = test::Real<int(const char*, const char*)>("rename");
   Step();
   const int result = real(from, to);
   if (result == 0) Change(DiskCalls::FileAt(std::filesystem::path(to).parent_path()));
@@ -93,7 +89,7 @@ VISIBLE int rename(const char* from, const char* to) noexcept {
 }
 
 VISIBLE int unlink(const char* path) noexcept {
-  static auto* const real = Real<int(const char*)>("unlink");
+  static auto* const real = test::Real<int(const char*)>("unlink");
   Step();
   return real(path);
 }

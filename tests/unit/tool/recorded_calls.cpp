@@ -11,7 +11,7 @@
 #include <cstdarg>
 #include <utility>
 
-#include "tests/support/open_mode.h"
+#include "tests/support/own_calls.h"
 
 namespace test {
 namespace {
