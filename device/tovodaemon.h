@@ -35,6 +35,9 @@ class SockConnection {
 
  protected:
   int fd_;  // -1 whenever not connected
+
+ private:
+  std::string ahead_;  // for a port that receives more than one message at once: what is left
 };
 
 // A SockConnection to a daemon that listens on a socket file.

@@ -2,15 +2,15 @@
 
 #include <sys/socket.h>
 
-#include <algorithm>
 #include <array>
 #include <cerrno>
 
 namespace host {
 namespace {
 
-// Grown as the bytes arrive, so that a length alone never makes the receiver take 16 MiB.
-constexpr std::size_t kReceiveStep = 65536;
+// What is received with one call: more than most messages. The memory grows as the bytes arrive, so
+// that a length alone never makes the receiver take 16 MiB.
+constexpr std::size_t kReceiveStep = 16384;
 
 bool SendAll(int fd, const char* data, std::size_t size) {
   while (size > 0) {
@@ -25,19 +25,18 @@ bool SendAll(int fd, const char* data, std::size_t size) {
   return true;
 }
 
-// Returns how many bytes arrived before the peer closed, or -1 when the socket failed.
-ssize_t RecvAll(int fd, char* data, std::size_t size) {
-  std::size_t got = 0;
-  while (got < size) {
-    const ssize_t n = ::recv(fd, data + got, size - got, 0);
-    if (n < 0) {
-      if (errno == EINTR) continue;
-      return -1;
-    }
-    if (n == 0) break;
-    got += static_cast<std::size_t>(n);
-  }
-  return static_cast<ssize_t>(got);
+// Waits for more bytes and appends them. False at the end of what the peer sent, with errno set to
+// `error_at_end`, and when the socket failed.
+bool RecvMore(int fd, std::string& received, int error_at_end) {
+  std::array<char, kReceiveStep> bytes;  // NOLINT: filled before it is read
+  ssize_t n = -1;
+  do {
+    n = ::recv(fd, bytes.data(), bytes.size(), 0);
+  } while (n < 0 && errno == EINTR);
+  if (n == 0) errno = error_at_end;
+  if (n <= 0) return false;
+  received.append(bytes.data(), static_cast<std::size_t>(n));
+  return true;
 }
 
 bool FailWith(int error) {
@@ -69,29 +68,28 @@ bool SendFrame(int fd, const std::string& message) {
   return SendAll(fd, frame.data(), frame.size());
 }
 
-bool RecvFrame(int fd, std::string& message) {
+bool RecvFrame(int fd, std::string& ahead, std::string& message) {
   message.clear();
-  std::array<char, kFrameHeaderBytes> header{};
-  const ssize_t got = RecvAll(fd, header.data(), header.size());
-  if (got < 0) return false;
-  if (got == 0) return FailWith(0);
-  if (got < static_cast<ssize_t>(header.size())) return FailWith(EPROTO);
-
-  std::size_t left = FrameLength(header.data());
-  if (left > kMaxFrameBytes) return FailWith(EMSGSIZE);
-
-  std::string text;
-  while (left > 0) {
-    const std::size_t step = std::min(left, kReceiveStep);
-    const std::size_t at = text.size();
-    text.resize(at + step);
-    const ssize_t n = RecvAll(fd, &text[at], step);
-    if (n < 0) return false;
-    if (n < static_cast<ssize_t>(step)) return FailWith(EPROTO);
-    left -= step;
+  std::string received;
+  received.swap(ahead);
+  while (received.size() < kFrameHeaderBytes) {
+    if (!RecvMore(fd, received, received.empty() ? 0 : EPROTO)) return false;
   }
-  message.swap(text);
+  const std::size_t length = FrameLength(received.data());
+  if (length > kMaxFrameBytes) return FailWith(EMSGSIZE);
+  while (received.size() - kFrameHeaderBytes < length) {
+    if (!RecvMore(fd, received, EPROTO)) return false;
+  }
+  ahead.assign(received, kFrameHeaderBytes + length);
+  received.resize(kFrameHeaderBytes + length);
+  received.erase(0, kFrameHeaderBytes);
+  message.swap(received);
   return true;
+}
+
+bool RecvFrame(int fd, std::string& message) {
+  std::string ahead;
+  return RecvFrame(fd, ahead, message);
 }
 
 }  // namespace host

@@ -19,9 +19,14 @@ std::size_t FrameLength(const char* header);
 // (EPIPE, without the signal), the message is too long (EMSGSIZE) or the socket fails.
 bool SendFrame(int fd, const std::string& message);
 
-// Receives one message from the blocking socket `fd`. False when the peer closes before the message
-// is complete (errno 0 when it closed between messages, EPROTO when inside one), when the announced
-// length is over the limit (EMSGSIZE) or when the socket fails; `message` is then empty.
+// Receives one message from the blocking socket `fd`, as a rule with one call. `ahead` holds what
+// has arrived behind the message before it, and then what has arrived behind this one. False when
+// the peer closes before the message is complete (errno 0 when it closed between messages, EPROTO
+// when inside one), when the announced length is over the limit (EMSGSIZE) or when the socket
+// fails; `message` is then empty.
+bool RecvFrame(int fd, std::string& ahead, std::string& message);
+
+// The same where nothing can be behind the message, as one who waits for an answer knows.
 bool RecvFrame(int fd, std::string& message);
 
 }  // namespace host

@@ -81,6 +81,7 @@ SockConnection::~SockConnection() { SockConnection::Disconnect(); }
 void SockConnection::Disconnect() {
   const host::sdk::UniqueFd closing(fd_);
   fd_ = -1;
+  ahead_.clear();
 }
 
 bool SockConnection::Send(const std::string& message) {
@@ -91,7 +92,7 @@ bool SockConnection::Send(const std::string& message) {
 bool SockConnection::Recv(std::string& message) {
   message.clear();
   if (fd_ == -1) return FailWith(ENOTCONN);
-  return host::RecvFrame(fd_, message);
+  return host::RecvFrame(fd_, ahead_, message);
 }
 
 DomainSockConnection::DomainSockConnection(const std::string& path) : path_(path) {}

@@ -78,11 +78,13 @@ TEST_F(FramingTest, AnEmptyMessageIsAMessage) {
 
 TEST_F(FramingTest, MessagesSentTogetherAreReceivedOneByOne) {
   WriteRaw("\0\0\0\3one\0\0\0\5three"s);
+  std::string ahead;
   std::string received;
-  ASSERT_TRUE(host::RecvFrame(near_, received));
+  ASSERT_TRUE(host::RecvFrame(near_, ahead, received));
   EXPECT_EQ(received, "one");
-  ASSERT_TRUE(host::RecvFrame(near_, received));
+  ASSERT_TRUE(host::RecvFrame(near_, ahead, received));
   EXPECT_EQ(received, "three");
+  EXPECT_EQ(ahead, "");
 }
 
 TEST_F(FramingTest, AFrameMayArriveByteByByte) {

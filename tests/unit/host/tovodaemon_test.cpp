@@ -118,6 +118,39 @@ TEST_F(DomainSockConnectionTest, CarriesAMessageEachWay) {
   daemon.join();
 }
 
+TEST_F(DomainSockConnectionTest, MessagesThatArriveTogetherAreReceivedOneByOne) {
+  Listen();
+  Connection connection(path_);
+  ASSERT_TRUE(connection.Connect(kTenDays));
+  const int daemon = Accept();
+  const std::string both("\0\0\0\3one\0\0\0\5three", 16);
+  ASSERT_EQ(write(daemon, both.data(), both.size()), static_cast<ssize_t>(both.size()));
+  std::string message;
+  EXPECT_TRUE(connection.Recv(message));
+  EXPECT_EQ(message, "one");
+  EXPECT_TRUE(connection.Recv(message));
+  EXPECT_EQ(message, "three");
+  close(daemon);
+}
+
+TEST_F(DomainSockConnectionTest, WhatOneConnectionHasReceivedIsNotTheNextOnes) {
+  Listen();
+  Connection connection(path_);
+  ASSERT_TRUE(connection.Connect(kTenDays));
+  const int first = Accept();
+  const std::string half("\0\0\0\3one\0\0\0\5thr", 14);
+  ASSERT_EQ(write(first, half.data(), half.size()), static_cast<ssize_t>(half.size()));
+  std::string message;
+  EXPECT_TRUE(connection.Recv(message));
+  ASSERT_TRUE(connection.Connect(kTenDays));
+  const int second = Accept();
+  ASSERT_TRUE(host::SendFrame(second, "another"));
+  EXPECT_TRUE(connection.Recv(message));
+  EXPECT_EQ(message, "another");
+  close(first);
+  close(second);
+}
+
 TEST_F(DomainSockConnectionTest, AnyTimeOutWillDoWhenTheDaemonListens) {
   Listen(64);
   for (const long timeout : {kTenDays, 1L, 0L, -1L, LONG_MAX, LONG_MIN}) {
