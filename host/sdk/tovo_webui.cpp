@@ -14,7 +14,7 @@ namespace sdk = host::sdk;
 namespace {
 
 // Far above any real language of any package.
-constexpr std::size_t kLongestFile = std::size_t{4} * 1024 * 1024;
+constexpr std::size_t kLongestFile = std::size_t{1024} * 1024;
 constexpr std::string_view kCommentMarks = "#;";
 
 std::optional<char> Unescape(char c) {
@@ -59,7 +59,7 @@ Json::Value ParseStrings(std::string_view rest) {
 
 }  // namespace
 
-// Reads one UTF-8 file `strings`, of at most 4 MiB, in the language's directory:
+// Reads one UTF-8 file `strings`, of at most 1 MiB, in the language's directory:
 //
 //   # a comment; so is a line that starts with ";"
 //   [section]

@@ -112,7 +112,7 @@ TEST_F(LittleMemory, HugeFilesAreNotRead) {
 
 // A hundred keywords of five times four megabytes, in two languages.
 TEST_F(LittleMemory, KeywordsThatAskForMoreThanThereIsAreAFailedSend) {
-  const std::string text(3'900'000, 'x');
+  const std::string text(1'040'000, 'x');
   test::WriteFile("/var/packages/App/target/ui/texts/enu/strings", "[a]\nt=\"" + text + "\"\n");
   std::string keywords = R"({"text":"a:t","weight":5})";
   for (int i = 1; i < 100; ++i) keywords += R"(,{"text":"a:t","weight":5})";
@@ -133,7 +133,7 @@ TEST_F(LittleMemory, DescriptorOfManyEmptyListsIsTaken) {
 
 TEST_F(LittleMemory, TextsOfManySectionsAreTaken) {
   std::string texts;
-  const auto bytes = test::Scaled<std::size_t>(50'000, 4'000'000);
+  const auto bytes = test::Scaled<std::size_t>(50'000, 1'000'000);
   for (int i = 0; texts.size() < bytes; ++i) texts += "[" + std::to_string(i) + "]\nk=\"\"\n";
   test::WriteFile("/var/packages/App/target/ui/texts/enu/strings", texts);
   for (const std::string& lang : test::LangsInOrder()) {
