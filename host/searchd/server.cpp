@@ -93,6 +93,8 @@ Server::Task Server::NextTask() {
     if (!handler_.IsQuick(request)) {
       return [this, connection = std::move(connection), request = std::move(request)]() mutable {
         if (const Task after = Serve(std::move(connection), request)) after();
+        // The waiting thread may have gone to wait before there was anything to do while idle.
+        if (handler_.HasIdleWork()) eventfd_write(wake_.Get(), 1);
       };
     }
     if (Task after = Serve(std::move(connection), request)) return after;

@@ -10,10 +10,12 @@
 #include <unistd.h>
 
 #include <array>
+#include <atomic>
 #include <cerrno>
 #include <chrono>
 #include <csignal>
 #include <cstring>
+#include <future>
 #include <optional>
 #include <string>
 #include <thread>
@@ -45,6 +47,40 @@ class Echo : public Handler {
   static constexpr std::size_t kLargeReply = std::size_t{8} * 1024 * 1024;
 };
 
+// Answers on a thread of its own, and has something to do while idle from then on: when the waiting
+// thread has looked for that already, and found nothing.
+class BusyOnceItAnswers : public Echo {
+ public:
+  bool IsQuick(const std::string&) override {
+    looks_next_ = true;
+    return false;
+  }
+  Answer Handle(const std::string& request, uid_t client) override {
+    looked_.get_future().wait();
+    has_work_ = true;
+    return Echo::Handle(request, client);
+  }
+  bool HasIdleWork() override {
+    if (looks_next_.exchange(false)) looked_.set_value();
+    return has_work_;
+  }
+  void DoIdleWork() override {
+    has_work_ = false;
+    done_.set_value();
+  }
+
+  bool IsDone() {
+    constexpr std::chrono::minutes kForEver(1);
+    return done_.get_future().wait_for(kForEver) == std::future_status::ready;
+  }
+
+ private:
+  std::atomic<bool> looks_next_ = false;
+  std::atomic<bool> has_work_ = false;
+  std::promise<void> looked_;
+  std::promise<void> done_;
+};
+
 class ServerTest : public ::testing::Test {
  protected:
   ServerTest() {
@@ -67,10 +103,11 @@ class ServerTest : public ::testing::Test {
   }
 
   // Serves in a thread of its own, with `call` failing.
-  void Start(const FailingCall& call = {}) {
+  void Start(const FailingCall& call = {}) { Start(echo_, call); }
+  void Start(Handler& handler, const FailingCall& call = {}) {
     failing_call = call;
-    thread_ = std::thread([this] {
-      Server server(echo_, listener_, signals_, seconds(3600));
+    thread_ = std::thread([this, &handler] {
+      Server server(handler, listener_, signals_, seconds(3600));
       server.Run(1);
     });
   }
@@ -156,6 +193,15 @@ TEST_F(ServerTest, AListeningSocketThatCannotBeWaitedForIsTriedAgain) {
 TEST_F(ServerTest, AWaitThatIsInterruptedGoesOn) {
   Start({"epoll_wait", EINTR, 0});
   EXPECT_EQ(Ask("one"), "one");
+}
+
+TEST_F(ServerTest, WhatARequestLeavesToDoIsDoneThoughNoOtherOneComes) {
+  BusyOnceItAnswers handler;
+  Start(handler);
+  EXPECT_EQ(Ask("one"), "one");
+  EXPECT_TRUE(handler.IsDone());
+  Signal(SIGTERM);
+  Join();
 }
 
 TEST_F(ServerTest, AReplyThatIsOnItsWayAtTheEndIsSent) {
