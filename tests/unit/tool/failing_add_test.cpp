@@ -24,6 +24,7 @@ using velkor::appindex::Add;
 using velkor::appindex::kAdd;
 
 constexpr std::size_t kMiB = std::size_t{1024} * 1024;
+constexpr std::size_t kLongestText = kMiB - 1024;  // that fits into a file of texts, among others
 constexpr int kNoError = -1;
 
 struct Way {
@@ -78,10 +79,11 @@ std::vector<Way> WaysOfTexts() {
       {"long desc", Entry(R"("desc":)" + Long(kMiB + 1)), 603},
       {"long keyword", Entry(R"("keywords":[)" + Long(kMiB) + "]"), 603},
       {"heavy keyword", Entry(R"("keywords":[{"weight":9,"text":)" + Long(kMiB / 8) + "}]"), 603},
-      {"long text", Entry(R"("desc":"x:long")"), 603, "long=" + Long(kMiB + 1) + "\n"},
+      {"heavy text", Entry(R"("keywords":[{"weight":9,"text":"x:long"}])"), 603,
+       "long=" + Long(kMiB / 2) + "\n"},
       {"bytes that grow", Entry("\"desc\":\"" + std::string(kMiB / 2, '\xFF') + "\""), 603},
       {"more than a message", R"({"app":"Bad","desc":"x:low","title":"x:low"})", 913,
-       "low=\"" + std::string(kMiB, '\x01') + "\"\n"},
+       "low=\"" + std::string(kLongestText, '\x01') + "\"\n"},
   };
 }
 
