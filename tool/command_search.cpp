@@ -17,6 +17,7 @@
 #include "tool/emphasis.h"
 #include "tool/languages.h"
 #include "tool/output.h"
+#include "tool/search_reply.h"
 #include "tool/wrap.h"
 
 namespace tool {
@@ -46,7 +47,9 @@ Json::Value Ask(const Options& options, const std::string& lang, const std::stri
   data["query"] = query;
   data["limit"] = options.limit;
   data["explain"] = options.explain || options.emphasise;
-  return AskDaemon("search", data);
+  Json::Value reply = AskDaemon("search", data);
+  RequireSearchReply(reply);
+  return reply;
 }
 
 // How the best hit was found, where that is not what the words say.

@@ -97,6 +97,11 @@ std::string Exchange(const std::string& request, microseconds patience) {
 
 }  // namespace
 
+void FailOfNonsense(const std::string& what) {
+  FailOfDaemon("has given an answer that makes no sense: " + what,
+               "install the daemon that belongs to this appindex");
+}
+
 Json::Value AskDaemon(const std::string& command, const Json::Value& data, microseconds patience) {
   Json::Value request;
   request["command"] = command;
@@ -108,8 +113,7 @@ Json::Value AskDaemon(const std::string& command, const Json::Value& data, micro
   if (is_reply && reply["success"].asBool()) return reply;
   const Json::Value error = is_reply ? reply["error"] : Json::Value();
   if (!error.isObject() || !error["code"].isInt() || !error["msg"].isString()) {
-    FailOfDaemon("has given an answer that makes no sense",
-                 "install the daemon that belongs to this appindex");
+    FailOfNonsense("it is no reply");
   }
   throw Error(error["code"].asInt(), error["msg"].asString());
 }

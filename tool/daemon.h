@@ -22,4 +22,7 @@ Json::Value AskDaemon(const std::string& command,
                       const Json::Value& data = Json::Value(Json::objectValue),
                       std::chrono::microseconds patience = kAnswerPatience);
 
+// Throws the Failure of an answer that cannot be understood, with what is wrong with it.
+[[noreturn]] void FailOfNonsense(const std::string& what);
+
 }  // namespace tool

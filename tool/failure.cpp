@@ -17,7 +17,7 @@
 #include "appindex/utilities/file_utils.h"
 #include "common/dir_reader.h"
 #include "common/file_io.h"
-#include "common/unique_fd.h"
+#include "tool/lock_path.h"
 #include "tool/output.h"
 #include "tool/refusal.h"
 
@@ -33,7 +33,7 @@ using velkor::appindex::elastic::kElasticdSockPath;
 constexpr int kUnknownCommand = 604;
 constexpr int kStorageFailure = 605;
 constexpr int kNotPermitted = 606;
-constexpr int kStarting[] = {607, 608, 610};
+constexpr int kNotReady[] = {607, 608, 610};
 
 constexpr std::size_t kLongestReason = 300;
 
@@ -70,12 +70,6 @@ int ErrorOfWriting(const std::string& dir) {
   return faccessat(AT_FDCWD, dir.c_str(), W_OK | X_OK, AT_EACCESS) == 0 ? 0 : errno;
 }
 
-int ErrorOfLocking(const std::string& path) {
-  const velkor::UniqueFd fd(open(path.c_str(), O_RDONLY | O_NONBLOCK | O_NOCTTY | O_CLOEXEC));
-  if (fd.IsOpen()) return 0;
-  return errno == ENOENT ? ErrorOfWriting(velkor::Dirname(path)) : errno;
-}
-
 int ErrorOfReading(const std::string& path) {
   std::string text;
   return velkor::ReadRegularFile(path, std::numeric_limits<std::size_t>::max(), text) ? 0 : errno;
@@ -96,7 +90,11 @@ Said LockLine(const std::string& reason) {
   }
   if (BeginsWith(reason, "open failed, path=")) {
     const std::string path = Behind(reason.substr(0, reason.find(", reason=")), '=');
-    return With(path + ": the lock file cannot be opened", ErrorOfLocking(path), kTryLater);
+    const std::string what = path + ": the lock file cannot be opened";
+    constexpr Protection kWhateverThereIs = {2, 2};  // that would make it fail, and it has
+    const LockPath lock = LookAtLock(path, kWhateverThereIs);
+    if (lock.state == LockPath::kProtected) return {what + ": " + WhyNotOpened(lock), "remove it"};
+    return With(what, lock.error, kTryLater);
   }
   return {"a lock cannot be taken: " + Readable(reason), kTryLater};
 }
@@ -167,7 +165,7 @@ Said DaemonLine(int code, const std::string& reason) {
   const std::string text =
       Readable(BeginsWith(reason, kPrefix) ? reason.substr(std::strlen(kPrefix)) : reason);
   const std::string daemon = std::string(kElasticdSockPath) + ": the search daemon ";
-  if (std::count(std::begin(kStarting), std::end(kStarting), code) != 0) {
+  if (IsNotReady(code)) {
     return {daemon + "is starting: " + text, "try again soon"};
   }
   const char* does = code == Error::kDaemonIndexMissing ? "has "
@@ -237,6 +235,10 @@ std::string AdviceOn(int error) {
     default:
       return kTryLater;
   }
+}
+
+bool IsNotReady(int code) {
+  return std::count(std::begin(kNotReady), std::end(kNotReady), code) != 0;
 }
 
 std::string WhyNotRead(int error) {

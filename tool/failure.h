@@ -35,6 +35,10 @@ class Failure : public std::runtime_error {
 // What to do about an error number of the system. Never empty.
 std::string AdviceOn(int error);
 
+// Whether the daemon's code says that it is not ready yet. Whoever works the queue then waits and
+// asks again, as after Error::kDaemonBusy, without limit.
+bool IsNotReady(int code);
+
 // Why ReadRegularFile did not read a descriptor or a file of its kind, by the number in `errno`.
 std::string WhyNotRead(int error);
 

@@ -4,7 +4,6 @@
 
 #include <algorithm>
 #include <cerrno>
-#include <cstring>
 #include <ctime>
 #include <limits>
 #include <sstream>
@@ -13,6 +12,7 @@
 #include "appindex/utilities/file_utils.h"
 #include "common/check.h"
 #include "common/file_io.h"
+#include "tool/failure.h"
 
 namespace tool {
 namespace {
@@ -48,7 +48,7 @@ RequestFile ReadRequestFile(const std::string& path) {
   if (!velkor::ReadRegularFile(path, std::numeric_limits<std::size_t>::max(), text)) {
     if (errno == ENOENT) return file;
     file.state = RequestFile::kUnreadable;
-    file.cause = std::strerror(errno);
+    file.cause = WhyNotRead(errno);
     return file;
   }
   file.state = RequestFile::kReadable;

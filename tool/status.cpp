@@ -95,6 +95,7 @@ Json::Value ToJson(const Lock& lock) {
     if (holder.has_ended) one["ended"] = true;
     value["holders"].append(one);
   }
+  AddProblem(value, lock.problem);
   return value;
 }
 
@@ -133,6 +134,23 @@ bool Status::IsWorked() const {
   });
 }
 
+bool Status::IsLockedOut() const {
+  return std::any_of(locks.begin(), locks.end(),
+                     [](const Lock& lock) { return !lock.problem.line.empty(); });
+}
+
+std::string Status::Waiting() const {
+  if (IsNotReady(daemon_code)) {
+    return "whoever works the queue waits 30 s and asks again, without limit";
+  }
+  if (daemon_code == velkor::Error::kDaemonBusy) {
+    return "whoever works the queue waits 15 to 19 min and asks again, without limit";
+  }
+  if (batch.state == RequestFile::kMissing || !IsWorked()) return "";
+  return "while the search daemon says nothing, is not ready (asked again after 30 s) or is busy "
+         "(asked again after 15 to 19 min), whoever works the batch waits, without limit";
+}
+
 bool Status::IsEven() const {
   for (const auto& [lang, found] : indexes) {
     const Index& first = indexes.begin()->second;
@@ -145,9 +163,7 @@ void Gather(Status& status, int proc) {
   status.batch = ReadRequestFile(index::kBatchPath);
   status.queue = ReadRequestFile(index::kQueuePath);
   status.order = Order(status.batch, status.queue);
-  for (const char* path : {index::kProcessLockPath, index::kQueuePath}) {
-    status.locks.push_back({path, LockHolders(proc, path)});
-  }
+  status.locks = ReadLocks(proc);
   status.version = ReadVersion();
   try {
     status.indexes = ReadIndexes();
@@ -185,6 +201,8 @@ Json::Value ToJson(const Status& status) {
   value["version"] = ToJson(status.version);
   for (const auto& [lang, found] : status.indexes) value["indexes"].append(ToJson(lang, found));
   if (!status.indexes.empty()) value["even"] = status.IsEven();
+  const std::string waiting = status.Waiting();
+  if (!waiting.empty()) value["waiting"] = waiting;
   return value;
 }
 

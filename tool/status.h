@@ -7,7 +7,7 @@
 #include <string>
 #include <vector>
 
-#include "tool/lock_holders.h"
+#include "tool/queue_locks.h"
 #include "tool/queue_state.h"
 
 namespace tool {
@@ -26,11 +26,6 @@ struct Index {
   std::string damage;
 };
 
-struct Lock {
-  std::string path;
-  std::vector<LockHolder> holders;
-};
-
 struct Status {
   std::string daemon_problem;   // empty: the search daemon answers
   bool daemon_refuses = false;  // it does, but does not say what indexes there are
@@ -47,6 +42,14 @@ struct Status {
 
   // Whether a process works the queue.
   bool IsWorked() const;
+
+  // Whether something is in the way of those who would work the queue, before they look at a
+  // request.
+  bool IsLockedOut() const;
+
+  // How whoever works the queue waits for the search daemon: it does if the daemon is not ready or
+  // busy, and may while a batch is worked. Empty when it does not.
+  std::string Waiting() const;
 
   // Whether there are as many documents in each language, as there are when nothing was
   // interrupted; nothing is known of it without `indexes`.

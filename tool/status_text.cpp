@@ -7,6 +7,8 @@
 #include <string>
 #include <vector>
 
+#include "appindex/error.h"
+#include "tool/failure.h"
 #include "tool/output.h"
 #include "tool/status.h"
 
@@ -67,9 +69,11 @@ void WriteProblem(std::ostream& out, const Problem& problem, std::size_t indent 
 
 void WriteDaemon(std::ostream& out, const Status& status) {
   Begin(out, "Search daemon");
-  out << (status.daemon_problem.empty() ? "answers"
-          : status.daemon_refuses       ? "refuses"
-                                        : "does not answer")
+  out << (status.daemon_problem.empty()                      ? "answers"
+          : !status.daemon_refuses                           ? "does not answer"
+          : IsNotReady(status.daemon_code)                   ? "is not ready"
+          : status.daemon_code == velkor::Error::kDaemonBusy ? "is busy"
+                                                             : "refuses")
       << "\n";
   if (!status.daemon_problem.empty()) {
     WriteProblem(out, {status.daemon_problem, false, status.daemon_code});
@@ -117,13 +121,17 @@ void WriteWaiting(std::ostream& out, const Status& status) {
     Continue(out);
     out << "all of the batch waits for it, since " << TimeText(status.batch.written) << "\n";
   } else if (status.batch.state == RequestFile::kReadable && status.daemon_problem.empty() &&
-             !status.IsWorked()) {
+             !status.IsWorked() && !status.IsLockedOut()) {
     Begin(out, "Left because");
     out << "not known here, no request of it fails; the system log may say\n";
   }
   if (const Step* step = status.FirstFailing(status.queue)) {
     WriteCulprit(out, "Will fail", *step);
   }
+  const std::string waiting = status.Waiting();
+  if (waiting.empty()) return;
+  Begin(out, "Waiting");
+  WriteWords(out, WordsOf(waiting));
 }
 
 void WriteOrder(std::ostream& out, const Status& status) {
@@ -144,6 +152,11 @@ void WriteOrder(std::ostream& out, const Status& status) {
 
 void WriteLocks(std::ostream& out, const Status& status) {
   for (const Lock& lock : status.locks) {
+    if (!lock.problem.line.empty()) {
+      Begin(out, "No lock");
+      WriteWords(out, {lock.path});
+      WriteProblem(out, lock.problem);
+    }
     for (const LockHolder& holder : lock.holders) {
       Begin(out, "Locked");
       const std::string pid = " (" + std::to_string(holder.pid) + ")";

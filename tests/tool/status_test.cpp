@@ -2,6 +2,7 @@
 #include <fcntl.h>
 #include <gmock/gmock.h>
 #include <sys/file.h>
+#include <sys/stat.h>
 #include <sys/wait.h>
 #include <unistd.h>
 
@@ -110,6 +111,37 @@ TEST_F(StatusCommand, HolderOfALockIsNamed) {
   EXPECT_TRUE(locks[1]["holders"].empty());
   EXPECT_THAT(Text(), HasSubstr(std::string("Locked          ") + kProcessLock +
                                 " by appindex_test (" + std::to_string(getpid()) + ")\n"));
+}
+
+TEST_F(StatusCommand, WhatIsInPlaceOfTheProcessLockIsToldAndLeftAlone) {
+  Enqueue(Request(1, ConfOf("Photos")));
+  MakeDirs(kProcessLock);
+  EXPECT_EQ(Status()["locks"][0]["code"].asInt(), 506);
+  EXPECT_THAT(Text(), HasSubstr(std::string("No lock         ") + kProcessLock + "\n"));
+  const Finished finished = Run({"process-queue"});
+  EXPECT_EQ(finished.status, 1);
+  EXPECT_THAT(finished.err, testing::EndsWith("(code 506)\n"));
+  ASSERT_EQ(rmdir(kProcessLock), 0);
+  ASSERT_EQ(mkfifo(kProcessLock, 0600), 0);
+  const Json::Value lock = Status()["locks"][0];
+  EXPECT_THAT(lock["problem"].asString(), HasSubstr("it is a FIFO"));
+  EXPECT_FALSE(lock.isMember("code"));
+}
+
+TEST_F(StatusCommand, WaitingWithoutLimitIsToldOfABatchThatIsWorked) {
+  WriteFile(kBatch, Request(1, ConfOf("Photos")) + "\n");
+  EXPECT_FALSE(Status().isMember("waiting"));
+  const velkor::LockFile lock(kProcessLock, true);
+  EXPECT_THAT(Status()["waiting"].asString(), HasSubstr("without limit"));
+}
+
+TEST_F(StatusCommand, WaitingWithoutLimitIsToldOfADaemonThatIsNotReady) {
+  daemon_.Stop();
+  const ScriptedDaemon daemon([](const Json::Value&) { return Failure(607, "starting up"); });
+  const Finished finished = Run({"status"});
+  EXPECT_EQ(finished.status, 1);
+  EXPECT_THAT(finished.out, HasSubstr("Search daemon   is not ready\n"));
+  EXPECT_THAT(finished.out, HasSubstr("Waiting         whoever works the queue waits 30 s"));
 }
 
 TEST_F(StatusCommand, VersionsAreCompared) {

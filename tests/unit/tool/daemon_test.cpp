@@ -96,7 +96,7 @@ TEST_F(AskDaemonTest, OtherEndsOfTheExchangeAreTold) {
   EXPECT_THAT(FailureOf().what(), HasSubstr("closed the connection without an answer; "));
   for (int reply = 1; reply < 8; ++reply) {
     const Failure failure = FailureOf();
-    EXPECT_THAT(failure.what(), HasSubstr("an answer that makes no sense; "));
+    EXPECT_THAT(failure.what(), HasSubstr("an answer that makes no sense: it is no reply; "));
     EXPECT_EQ(failure.exit_code(), kDaemonUnreachable);
   }
 }

@@ -108,6 +108,8 @@ INSTANTIATE_TEST_SUITE_P(
             "/etc/passwd: the lock file cannot be opened; try again later"},
         Row{506, "open failed, path=/etc/passwd/lock, reason=Success",
             "/etc/passwd/lock: the lock file cannot be opened: Not a directory; see whether .*"},
+        Row{506, "open failed, path=/var/packages/App, reason=Success",
+            "/var/packages/App: the lock file cannot be opened: Is a directory; put .*"},
         Row{506, "No locks available",
             "a lock cannot be taken: No locks available; try again later"},
         Row{801, "", "the user Velkor, .* cannot be looked up; add it to the user database"},
@@ -161,6 +163,19 @@ TEST(Explain, CauseThatTheLibraryLostIsFoundAgain) {
   const std::string line = LineOf(506, "open failed, path=/no/such/dir/lock, reason=Success");
   EXPECT_THAT(line, AllOf(StartsWith("/no/such/dir/lock: "), HasSubstr("No such file or directory"),
                           Not(HasSubstr("Success"))));
+}
+
+class ExplainOfALock : public test::DeviceRootTest {};
+
+// It could be opened otherwise.
+TEST_F(ExplainOfALock, AnothersFileInASharedDirectoryIsToBlame) {
+  if (!test::IsTrueRoot()) GTEST_SKIP() << "needs root: gives a file away";
+  test::WriteFile("/tmp/lock", "");
+  ASSERT_EQ(chown("/tmp/lock", 1001, 100), 0);
+  EXPECT_THAT(
+      LineOf(506, "open failed, path=/tmp/lock, reason=Success"),
+      AllOf(StartsWith("/tmp/lock: the lock file cannot be opened: it belongs to user 1001"),
+            EndsWith("; remove it")));
 }
 
 TEST(Explain, LongReasonsAreCutAndStayOnOneLine) {

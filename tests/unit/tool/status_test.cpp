@@ -2,10 +2,13 @@
 #include "tool/status.h"
 
 #include <gmock/gmock.h>
+#include <sys/stat.h>
+#include <unistd.h>
 #include <utime.h>
 
 #include <ctime>
 
+#include "appindex/index_mgr.h"
 #include "appindex/utilities/json_helpers.h"
 #include "tests/support/indexing.h"
 #include "tests/support/scripted_daemon.h"
@@ -74,6 +77,27 @@ TEST_F(StatusTest, RebuildNamesTheApplicationToBlame) {
   test::WriteFile(kBatch, "{\"op\":3}\n");
   EXPECT_THAT(Data()["held_up_by"]["problem"].asString(), HasSubstr(ConfOf("Broken") + ": "));
   EXPECT_THAT(Text(), HasSubstr("Held up by      reindex everything\n"));
+}
+
+// Root reads every directory, so this is somebody else; the library then fails as is told.
+TEST_F(StatusTest, RebuildNamesTheDirectoryThatCannotBeRead) {
+  if (!test::IsTrueRoot()) GTEST_SKIP() << "needs root: becomes another user";
+  const std::string dir = "/var/packages/App/target/private";
+  test::WriteFile(dir + "/index.conf", R"({"app":"App","title":"App"})");
+  ASSERT_EQ(chmod(dir.c_str(), 0700), 0);
+  test::WriteFile(kQueue, "{\"op\":3}\n");
+  ASSERT_EQ(seteuid(1001), 0);
+  const Json::Value culprit = Data()["held_up_by"];
+  const std::string text = Text();
+  const velkor::Error error = test::ThrownBy(velkor::appindex::Reindex);
+  ASSERT_EQ(seteuid(0), 0);
+  EXPECT_EQ(culprit["op"].asString(), "reindex");
+  EXPECT_EQ(culprit["problem"].asString(),
+            dir + "/: the directory cannot be read: Permission denied; run appindex as root");
+  EXPECT_EQ(culprit["code"].asInt(), 502);
+  EXPECT_EQ(error.code, 502);
+  EXPECT_THAT(text,
+              HasSubstr("Will fail       reindex everything\n                ! " + dir + "/: "));
 }
 
 TEST_F(StatusTest, CulpritBehindManyRequestsIsNamedAllTheSame) {

@@ -12,19 +12,20 @@ namespace tool {
 
 class StatusTestDevice : public test::DeviceRootTest {
  protected:
-  static Json::Value Data() {
+  static constexpr int kNoProc = -1;
+
+  static Json::Value Data(int proc = kNoProc) {
     Status status;
-    return ToJson(Gathered(status));
+    return ToJson(Gathered(status, proc));
   }
   static std::string Text() {
     Status status;
-    return ToText(Gathered(status));
+    return ToText(Gathered(status, kNoProc));
   }
 
  private:
-  static const Status& Gathered(Status& status) {
-    constexpr int kNoProc = -1;
-    Gather(status, kNoProc);
+  static const Status& Gathered(Status& status, int proc) {
+    Gather(status, proc);
     return status;
   }
 };

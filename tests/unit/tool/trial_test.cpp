@@ -2,6 +2,7 @@
 #include "tool/trial.h"
 
 #include <gmock/gmock.h>
+#include <sys/stat.h>
 #include <unistd.h>
 
 #include "appindex/index_queue_internal.h"
@@ -94,6 +95,23 @@ TEST_F(TrialTest, RebuildThatCannotBeginOrEndIsTold) {
   EXPECT_THAT(Trial().ProblemOf(kReindex, "").line, HasSubstr("os-release"));
   ASSERT_EQ(rmdir("/usr/tovo/tovoman/webman/modules"), 0);
   EXPECT_THAT(Trial().ProblemOf(kReindex, "").line, HasSubstr("webman/modules/"));
+}
+
+// Root reads every directory, so this is somebody else.
+TEST_F(TrialTest, RebuildNamesTheDirectoryThatCannotBeRead) {
+  if (!test::IsTrueRoot()) GTEST_SKIP() << "needs root: becomes another user";
+  test::Install("Good");
+  const std::string dir = "/var/packages/App/target/private";
+  test::MakeDirs(dir);
+  ASSERT_EQ(chmod(dir.c_str(), 0700), 0);
+  EXPECT_EQ(Trial().ProblemOf(kReindex, "").line, "");
+  ASSERT_EQ(seteuid(1001), 0);
+  const Problem problem = Trial().ProblemOf(kReindex, "");
+  ASSERT_EQ(seteuid(0), 0);
+  EXPECT_EQ(problem.line,
+            dir + "/: the directory cannot be read: Permission denied; run appindex as root");
+  EXPECT_TRUE(problem.fails);
+  EXPECT_EQ(problem.code, 502);
 }
 
 TEST_F(TrialTest, NothingIsLogged) {
