@@ -133,6 +133,7 @@ TEST_F(SearchdLife, LeavesASocketInUseAlone) {
 }
 
 TEST_F(SearchdLife, GoesToTheBackgroundWhenReady) {
+  if (!MayGoToTheBackground()) GTEST_SKIP() << "needs root with ThreadSanitizer";
   SearchdProcess start({"--root", root_}, false);
   EXPECT_EQ(start.Wait().status, 0);
   Fill("enu");
@@ -142,6 +143,7 @@ TEST_F(SearchdLife, GoesToTheBackgroundWhenReady) {
 }
 
 TEST_F(SearchdLife, ReportsAFailedStartInTheBackground) {
+  if (!MayGoToTheBackground()) GTEST_SKIP() << "needs root with ThreadSanitizer";
   fs::create_directories(root_ / "var/run");
   WriteFileOf(Socket(), "mine");
   const SearchdProcess::Result result = SearchdProcess({"--root", root_}, false).Wait();

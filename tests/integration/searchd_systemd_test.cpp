@@ -119,6 +119,7 @@ TEST_F(SearchdSystemd, MayHandOverTheSocket) {
 }
 
 TEST_F(SearchdSystemd, MayStartItInTheBackgroundWithASocket) {
+  if (!MayGoToTheBackground()) GTEST_SKIP() << "needs root with ThreadSanitizer";
   const Fd listener = Listener();
   ASSERT_EQ(listen(listener.Get(), 10), 0);
   SearchdProcess start({"--root", root_}, false, [&] { HandOver({listener.Get()}); });

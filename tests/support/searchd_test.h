@@ -39,6 +39,10 @@ class SearchdTest : public testing::Test {
   // Fails the test when it does not become ready.
   void Start(const std::vector<std::string>& more = {});
   void Restart(int signal);
+  // Whether a daemon in the background can enter its root. Who is not root does so through a user
+  // namespace, which only a process of one thread may enter; ThreadSanitizer gives a forked one a
+  // second.
+  static bool MayGoToTheBackground();
   // Ends a daemon that has gone to the background, and waits for its end.
   void StopBackground() const;
 
