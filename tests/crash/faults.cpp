@@ -25,9 +25,9 @@ const std::vector<Entry>& Table() {
     {SYS_openat, "openat", {EIO, EACCES, EMFILE, ENOMEM, EINTR}},
     {SYS_read, "read", {EIO, ENOMEM, EINTR, kPart}},
     {SYS_pread64, "pread64", {EIO, ENOMEM, EINTR, kPart}},
-    {SYS_write, "write", {EIO, ENOSPC, EDQUOT, EINTR, kPart}},
-    {SYS_pwrite64, "pwrite64", {EIO, ENOSPC, EDQUOT, EINTR, kPart}},
-    {SYS_writev, "writev", {EIO}},
+    {SYS_write, "write", {EIO, ENOSPC, EDQUOT, EROFS, EINTR, kPart}},
+    {SYS_pwrite64, "pwrite64", {EIO, ENOSPC, EDQUOT, EROFS, EINTR, kPart}},
+    {SYS_writev, "writev", {EIO, ENOSPC, EDQUOT, EROFS, EINTR, kPart}},
     {SYS_close, "close", {EIO, EINTR}},
     {SYS_fsync, "fsync", {EIO, ENOSPC, EDQUOT, EROFS}},
     {SYS_fdatasync, "fdatasync", {EIO, ENOSPC, EDQUOT, EROFS}},
@@ -89,12 +89,36 @@ const Entry* Find(long number) {
 }
 
 // A call that makes a file may find that there is no room for one.
+std::vector<int> MoreErrorsOfOpen(std::uint64_t flags) {
+  if ((flags & O_CREAT) != 0) return {ENOSPC, EDQUOT, EROFS};
+  if ((flags & O_ACCMODE) != O_RDONLY) return {EROFS};
+  return {};
+}
+
+std::vector<int> MoreErrorsOfFcntl(std::uint64_t command) {
+  switch (command) {
+    case F_DUPFD:
+    case F_DUPFD_CLOEXEC:
+      return {EMFILE};
+    case F_SETLK:
+    case F_OFD_SETLK:
+      return {EAGAIN, ENOLCK, EINTR};
+    case F_SETLKW:
+      return {EDEADLK, ENOLCK, EINTR};
+    case F_OFD_SETLKW:
+      return {ENOLCK, EINTR};
+    default:
+      return {};
+  }
+}
+
 std::vector<int> ErrorsOf(const SystemCall& call, const Entry& entry) {
   std::vector<int> errors = entry.errors;
-  if (call.number == SYS_openat && (call.arguments[2] & O_CREAT) != 0) {
-    errors.insert(errors.end(), {ENOSPC, EDQUOT, EROFS});
-  }
-  // A part of one byte or of nothing is not less than it.
+  std::vector<int> more;
+  if (call.number == SYS_openat) more = MoreErrorsOfOpen(call.arguments[2]);
+  if (call.number == SYS_fcntl) more = MoreErrorsOfFcntl(call.arguments[1]);
+  errors.insert(errors.end(), more.begin(), more.end());
+  // A part of one byte, or of one of writev's pieces, or of nothing is not less than it.
   if (call.arguments[2] < 2)
     errors.erase(std::remove(errors.begin(), errors.end(), kPart), errors.end());
   return errors;
@@ -134,6 +158,12 @@ std::vector<Fault> FaultsOf(const SystemCall& call) {
     if (error != EINTR) faults.push_back({error, true});
   }
   return faults;
+}
+
+bool MayFailSo(const SystemCall& call, const Fault& fault) {
+  const std::vector<Fault> faults = FaultsOf(call);
+  return std::any_of(faults.begin(), faults.end(),
+                     [&](const Fault& other) { return other.error == fault.error; });
 }
 
 bool IsPassedOver(const SystemCall& call) {

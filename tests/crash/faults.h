@@ -23,6 +23,10 @@ struct Fault {
 // about which nothing is known here: the table wants a line for it.
 std::vector<Fault> FaultsOf(const SystemCall& call);
 
+// Whether the fault is one of those: one that comes for good leaves out calls of its number that
+// cannot fail so.
+bool MayFailSo(const SystemCall& call, const Fault& fault);
+
 // Whether the call is not counted. It changes nothing but the process's own memory: whoever dies
 // before it leaves the same behind as before the next call, and memory that is not to be had is a
 // matter of operator new. Or it asks for chance, as often as chance has it.

@@ -6,7 +6,9 @@
 #include <syslog.h>
 #include <unistd.h>
 
+#include <algorithm>
 #include <csignal>
+#include <iterator>
 #include <sstream>
 
 namespace test {
@@ -58,11 +60,21 @@ ProcessState ProcessState::Now() {
 }
 
 std::string ProcessState::Changes(const ProcessState& after) const {
-  return Change("descriptors", descriptors, after.descriptors) +
-         Change("users", users, after.users) + Change("groups", groups, after.groups) +
+  std::vector<int> still_open;
+  std::set_intersection(descriptors.begin(), descriptors.end(), after.descriptors.begin(),
+                        after.descriptors.end(), std::back_inserter(still_open));
+  return Change("descriptors", descriptors, still_open) + Change("users", users, after.users) +
+         Change("groups", groups, after.groups) +
          Change("umask", std::vector<mode_t>{mask}, std::vector<mode_t>{after.mask}) +
          Change("working directory", directory, after.directory) +
          Change("signals", signals, after.signals);
+}
+
+std::string ProcessState::Kept(const ProcessState& after) const {
+  std::vector<int> kept;
+  std::set_difference(after.descriptors.begin(), after.descriptors.end(), descriptors.begin(),
+                      descriptors.end(), std::back_inserter(kept));
+  return Text(kept);
 }
 
 }  // namespace test

@@ -20,8 +20,11 @@ struct ProcessState {
   // own.
   static ProcessState Now();
 
-  // What of it is otherwise in `after`; empty when all is the same.
+  // What of it is otherwise in `after`, but for descriptors that are open only there; empty when
+  // all is the same.
   std::string Changes(const ProcessState& after) const;
+  // Those descriptors; empty when there are none.
+  std::string Kept(const ProcessState& after) const;
 };
 
 }  // namespace test

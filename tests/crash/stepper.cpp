@@ -227,22 +227,23 @@ void Stepper::Resume(pid_t thread, int signal) {
 }
 
 std::string Stepper::PathOf(const SystemCall& call) const {
-  if (NamesFileFirst(call.number)) return TextAt(call.arguments[0]);
+  if (NamesFileFirst(call.number)) return TextAt(call.thread, call.arguments[0]);
   if (!NamesFileSecond(call.number)) {
     return NamesNoFile(call.number) ? "" : FileOf(call.arguments[0]);
   }
-  const std::string name = TextAt(call.arguments[1]);
+  const std::string name = TextAt(call.thread, call.arguments[1]);
   if (!name.empty() && name[0] == '/') return name;
   if (static_cast<int>(call.arguments[0]) == AT_FDCWD) return name;
   const std::string directory = FileOf(call.arguments[0]);
   return name.empty() ? directory : directory + "/" + name;
 }
 
-std::string Stepper::TextAt(std::uint64_t address) const {
+// Only a thread that is stopped shows the memory of its process.
+std::string Stepper::TextAt(pid_t thread, std::uint64_t address) {
   std::string text;
   for (; text.size() < PATH_MAX; address += sizeof(long)) {
     errno = 0;
-    const long word = ptrace(PTRACE_PEEKDATA, process_, address, nullptr);
+    const long word = ptrace(PTRACE_PEEKDATA, thread, address, nullptr);
     if (errno != 0) break;
     std::array<char, sizeof(long)> bytes{};
     std::memcpy(bytes.data(), &word, sizeof(long));

@@ -22,7 +22,7 @@ struct Step {
   enum Kind {
     kGoOn,
     kKill,             // the process dies, as from SIGKILL, and the call is not made
-    kFail,             // the call is not made and fails with `error`
+    kFail,             // the call is not made and fails with `error`, or returns 0 if that is 0
     kFailAfterwards,   // it is made and fails with `error` all the same: what close does
     kReplaceArgument,  // it is made with `value` in place of one argument
   };
@@ -74,7 +74,7 @@ class Stepper {
   void Enter(const SystemCall& call);
   void Leave(pid_t thread);
   void Resume(pid_t thread, int signal);
-  std::string TextAt(std::uint64_t address) const;
+  static std::string TextAt(pid_t thread, std::uint64_t address);
   std::string FileOf(std::uint64_t descriptor) const;
 
   const int outside_root_;

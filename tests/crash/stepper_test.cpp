@@ -4,10 +4,13 @@
 
 #include <fcntl.h>
 #include <gtest/gtest.h>
+#include <sched.h>
 #include <sys/syscall.h>
 #include <sys/wait.h>
 #include <unistd.h>
 
+#include <algorithm>
+#include <atomic>
 #include <cerrno>
 #include <csignal>
 #include <thread>
@@ -104,6 +107,22 @@ TEST_F(StepperTest, NamesTheFileOfACall) {
   };
   EXPECT_EQ(Run(write_text, -1, Step{}).status, 0);
   EXPECT_EQ(paths_, (std::vector<std::string>{kFile, kFile, ""})) << "open, write, exit";
+}
+
+// While the first thread runs.
+TEST_F(StepperTest, NamesTheFileOfAThreadsCall) {
+  constexpr int kTimes = 100;
+  const auto look = [] {
+    std::atomic<bool> done = false;
+    std::thread thread([&] {
+      for (int i = 0; i < kTimes; ++i) syscall(SYS_faccessat, AT_FDCWD, kFile, F_OK);
+      done = true;
+    });
+    while (!done) sched_yield();
+    thread.join();
+  };
+  EXPECT_EQ(Run(look, -1, Step{}).status, 0);
+  EXPECT_EQ(std::count(paths_.begin(), paths_.end(), kFile), kTimes);
 }
 
 TEST_F(StepperTest, LooksAtThreadsToo) {

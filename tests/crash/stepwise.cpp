@@ -27,6 +27,7 @@ struct Report {
   int code;
   char text[4000];
   char changes[4000];
+  char kept[4000];
 };
 
 void Put(char (&to)[4000], const std::string& text) { to[text.copy(to, sizeof(to) - 1)] = '\0'; }
@@ -60,7 +61,9 @@ void RunAndReport(const std::function<void()>& act) {
   Stepper::Mark();
   report.code = code;
   Put(report.text, text);
-  Put(report.changes, before.Changes(ProcessState::Now()));
+  const ProcessState after = ProcessState::Now();
+  Put(report.changes, before.Changes(after));
+  Put(report.kept, before.Kept(after));
   report.kind = kind;
 }
 
@@ -80,12 +83,6 @@ void RunApart(const std::function<void()>& work) {
   int status = -1;
   EXPECT_EQ(waitpid(child, &status, 0), child);
   EXPECT_EQ(status, 0) << "undisturbed, it fails";
-}
-
-bool MayFailSo(const SystemCall& call, const Fault& fault) {
-  const std::vector<Fault> faults = FaultsOf(call);
-  return std::any_of(faults.begin(), faults.end(),
-                     [&](const Fault& other) { return other.error == fault.error; });
 }
 
 }  // namespace
@@ -127,6 +124,7 @@ void Stepwise::Record() {
   });
   ASSERT_EQ(outcome.report.kind, Report::kDone) << outcome.report.text;
   EXPECT_STREQ(outcome.report.changes, "");
+  EXPECT_STREQ(outcome.report.kept, "");
   expected_ = subject_.result();
 }
 
@@ -141,6 +139,8 @@ void Stepwise::Kill(std::size_t point) {
     return step;
   });
   ++(outcome.end.killed ? tally_.killed : tally_.survived);
+  // One thread does the work: it makes the same calls in every run.
+  EXPECT_TRUE(outcome.end.killed) << "it made " << next << " calls";
   EXPECT_EQ(subject_.wrong(), "");
   RunApart(subject_.again);
   EXPECT_EQ(subject_.result(), expected_);
@@ -187,8 +187,9 @@ void Stepwise::Judge(const Injection& injection, const Outcome& outcome,
     EXPECT_TRUE(outcome.report.kind == Report::kDone || outcome.report.kind == Report::kError)
         << outcome.report.text;
   }
+  EXPECT_STREQ(outcome.report.changes, "");
   if (!excuse.may_keep_descriptor) {
-    EXPECT_STREQ(outcome.report.changes, "");
+    EXPECT_STREQ(outcome.report.kept, "") << "descriptors that it keeps";
   }
   EXPECT_EQ(subject_.wrong(), "");
   if (subject_.done_when_it_returns && outcome.report.kind == Report::kDone) {
