@@ -94,6 +94,18 @@ std::string TextsOf(const std::string& package, const std::string& lang) {
   return "/var/packages/" + package + "/target/ui/texts/" + lang + "/strings";
 }
 
+// The titles that the daemon was sent, by language.
+std::map<std::string, std::string> TitlesIn(ScriptedDaemon& daemon) {
+  std::map<std::string, std::string> titles;
+  for (const Json::Value& request : daemon.Requests()) {
+    if (request["command"] != "document_upsert_by_id") continue;
+    const std::string id = request["data"]["id"].asString();
+    titles[id.substr(id.size() - 3)] = request["data"]["data"]["title"].asString();
+  }
+  EXPECT_EQ(titles.size(), test::LangsInOrder().size());
+  return titles;
+}
+
 class HostileTexts : public HostileFiles {
  protected:
   // A package with texts in French and in one more language, which the file is for.
@@ -108,17 +120,10 @@ class HostileTexts : public HostileFiles {
     return file.make(TextsOf(name, lang));
   }
 
-  // The titles that are sent, by language.
   static std::map<std::string, std::string> TitlesOf(const std::string& name) {
     ScriptedDaemon daemon;
     Add(ConfOf(name), false);
-    std::map<std::string, std::string> titles;
-    for (const Json::Value& request : daemon.Requests()) {
-      const std::string id = request["data"]["id"].asString();
-      titles[id.substr(id.size() - 3)] = request["data"]["data"]["title"].asString();
-    }
-    EXPECT_EQ(titles.size(), 21U);
-    return titles;
+    return TitlesIn(daemon);
   }
 };
 
@@ -168,6 +173,27 @@ TEST_F(ChangingFiles, TextsThatVanishOrChangeBetweenTwoLanguagesAreThoseOfTheBeg
   EXPECT_EQ(requests[20]["data"]["data"]["title"].asString(), "Title trk");
 }
 
+// A descriptor is read anew for each language.
+TEST_F(ChangingFiles, DescriptorThatIsAnotherValidOneBetweenTwoLanguagesGivesThatFromThenOn) {
+  test::WriteFile(ConfOf("App"), R"({"app":"Old","title":"Old title"})");
+  test::Time().usleeps.clear();
+  test::Time().on_usleep = [](unsigned) {
+    if (test::Time().usleeps.size() != 3) return;
+    test::WriteFile(ConfOf("App"), R"({"app":"New","title":"New title","modules":[]})");
+  };
+  ScriptedDaemon daemon;
+  Add(ConfOf("App"), false);
+  std::vector<std::string> expected;
+  for (const std::string& lang : test::LangsInOrder()) {
+    const bool before = expected.size() < 3;
+    expected.push_back("document_upsert_by_id appindex_" + lang + (before ? " Old" : " New"));
+  }
+  EXPECT_EQ(daemon.Commands(), expected);
+  std::map<std::string, std::string> titles = TitlesIn(daemon);
+  EXPECT_EQ(titles["csy"], "Old title");
+  EXPECT_EQ(titles["dan"], "New title");
+}
+
 TEST_F(ChangingFiles, DescriptorThatVanishesBetweenTwoLanguagesEndsItsDeletionToo) {
   test::Install("App");
   int commits = 0;
@@ -200,6 +226,26 @@ TEST_F(ChangingFiles, ThoseThatMayNotBeReadGiveNothing) {
   Add(ConfOf("App"), true);
   ASSERT_EQ(seteuid(0), 0);
   EXPECT_EQ(daemon.Commands(), PerLang({"commit appindex_LANG"}));
+}
+
+// The texts are read as whoever calls: a language that may not be read has the English ones.
+TEST_F(ChangingFiles, TextsThatMayNotBeReadLeaveTheEnglishOnes) {
+  if (!test::IsTrueRoot()) GTEST_SKIP() << "needs root: switches to another user";
+  for (const char* lang : {"enu", "fre", "ger"}) {
+    test::WriteFile(kTexts + std::string(lang) + "/strings",
+                    "[app]\ntitle=\"Title " + std::string(lang) + "\"\n",
+                    lang == std::string("ger") ? 0 : 0644);
+  }
+  test::WriteFile(ConfOf("App"), R"({"app":"App","title":"app:title"})");
+  ScriptedDaemon daemon;
+  ASSERT_EQ(chmod(test::kSocket, 0666), 0);
+  ASSERT_EQ(seteuid(1001), 0);
+  Add(ConfOf("App"), true);
+  ASSERT_EQ(seteuid(0), 0);
+  std::map<std::string, std::string> titles = TitlesIn(daemon);
+  EXPECT_EQ(titles["fre"], "Title fre");
+  EXPECT_EQ(titles["ger"], "Title enu");
+  EXPECT_EQ(titles["trk"], "Title enu");
 }
 
 // What is looked at is not acted upon.

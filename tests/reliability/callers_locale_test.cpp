@@ -2,10 +2,6 @@
 #include <gtest/gtest.h>
 #include <json/writer.h>  // prints values in failure messages
 
-#include <clocale>
-#include <cstdio>
-#include <cstdlib>
-#include <filesystem>
 #include <locale>
 #include <string>
 #include <utility>
@@ -49,33 +45,6 @@ TEST_F(CallersLocale, OfTheSystemChangesNothing) {
   uselocale(locale_);
   ExpectTheUsual(usual);
 }
-
-#ifdef WITHOUT_SANITIZER  // which would report what the C library loses where LOCPATH is set
-
-class CallersGermanLocale : public CallersLocale {
- protected:
-  // Makes one with a decimal comma.
-  static void SetUpTestSuite() {
-    std::string place = (std::filesystem::temp_directory_path() / "locale-XXXXXX").string();
-    ASSERT_NE(mkdtemp(place.data()), nullptr);
-    const std::string make = "localedef -i de_DE -f UTF-8 " + place + "/de_DE.UTF-8 2>/dev/null";
-    setenv("LOCPATH", place.c_str(), 1);
-    if (std::system(make.c_str()) == 0) locale_ = newlocale(LC_ALL_MASK, "de_DE.UTF-8", nullptr);
-    std::filesystem::remove_all(place);
-  }
-};
-
-TEST_F(CallersGermanLocale, ChangesNothing) {
-  if (locale_ == nullptr) GTEST_SKIP() << "needs localedef and the definition of de_DE";
-  const auto usual = UsualIndexes();
-  uselocale(locale_);
-  char text[16];
-  std::snprintf(text, sizeof(text), "%.1f", 2.5);
-  ASSERT_STREQ(text, "2,5");
-  ExpectTheUsual(usual);
-}
-
-#endif
 
 class CommaAndGroups : public std::numpunct<char> {
  protected:

@@ -1,6 +1,10 @@
 // A process that uses the library for everything that it exports.
 #pragma once
 
+#include <sys/wait.h>
+#include <unistd.h>
+
+#include <functional>
 #include <string>
 
 #include "tests/crash/index_model.h"
@@ -10,6 +14,16 @@
 #include "tests/support/scripted_daemon.h"
 
 namespace test {
+
+// The exit status of a process that does `work` and ends with what it returns; 128 and the signal
+// when one ends it.
+inline int StatusOf(const std::function<int()>& work) {
+  const pid_t child = fork();
+  if (child == 0) _exit(work());
+  int status = 0;
+  waitpid(child, &status, 0);
+  return WIFEXITED(status) ? WEXITSTATUS(status) : 128 + WTERMSIG(status);
+}
 
 class CallersProcess : public DeviceRootTest {
  protected:

@@ -4,7 +4,6 @@
 #include <gtest/gtest.h>
 #include <json/writer.h>  // prints values in failure messages
 #include <pthread.h>
-#include <sys/wait.h>
 #include <unistd.h>
 
 #include <csignal>
@@ -24,17 +23,8 @@ namespace {
 using test::AllCalls;
 using test::CallersProcess;
 using test::ExportedCall;
+using test::StatusOf;
 using velkor::appindex::LanguagePack;
-
-// The exit status of a process that does `work` and ends with what it returns; 128 and the signal
-// when one ends it.
-int StatusOf(const std::function<int()>& work) {
-  const pid_t child = fork();
-  if (child == 0) _exit(work());
-  int status = 0;
-  waitpid(child, &status, 0);
-  return WIFEXITED(status) ? WEXITSTATUS(status) : 128 + WTERMSIG(status);
-}
 
 TEST_F(CallersProcess, GetsFromEveryFunctionWhatItIsToGive) { EXPECT_EQ(Fault(AllCalls()), ""); }
 

@@ -28,17 +28,30 @@ void Overwrite(std::string& content, std::size_t offset, const std::string& text
 
 // A part of what was written: its beginning, or some of its blocks.
 void OverwriteSome(std::string& content, std::size_t offset, const std::string& text,
-                   std::mt19937& random) {
-  if (random() % 2 == 0) {
-    Overwrite(content, offset, text.substr(0, random() % (text.size() + 1)));
+                   Chance& chance) {
+  if (chance.Below(2) == 0) {
+    Overwrite(content, offset, text.substr(0, chance.Below(text.size() + 1)));
     return;
   }
   for (std::size_t at = 0; at < text.size(); at += kBlock) {
-    if (random() % 2 == 0) Overwrite(content, offset + at, text.substr(at, kBlock));
+    if (chance.Below(2) == 0) Overwrite(content, offset + at, text.substr(at, kBlock));
   }
 }
 
 }  // namespace
+
+std::size_t EveryChance::Below(std::size_t n) {
+  if (asked_ == answers_.size()) answers_.push_back({0, n});
+  return answers_[asked_++].given;
+}
+
+bool EveryChance::Next() {
+  asked_ = 0;
+  while (!answers_.empty() && ++answers_.back().given == answers_.back().below) {
+    answers_.pop_back();
+  }
+  return !answers_.empty();
+}
 
 std::vector<DiskAct> ReadDiskActs(const std::string& file) {
   const std::string bytes = Content(file);
@@ -152,12 +165,12 @@ void Disk::Commit(Node& node, std::size_t acts) {
 }
 
 // The mode of a directory keeps its place among the entries.
-void Disk::CommitSome(Node& node, std::mt19937& random) {
-  if (node.directory) return Commit(node, random() % (node.pending.size() + 1));
+void Disk::CommitSome(Node& node, Chance& chance) {
+  if (node.directory) return Commit(node, chance.Below(node.pending.size() + 1));
   for (const DiskAct& act : node.pending) {
-    const unsigned long luck = random() % 3;
+    const std::size_t luck = chance.Below(3);
     if (luck == 1 && act.record.kind == DiskRecord::kWrite) {
-      OverwriteSome(node.content, act.record.value, act.text, random);
+      OverwriteSome(node.content, act.record.value, act.text, chance);
     } else if (luck != 0) {
       CarryOut(node, act, 0);
     }
@@ -169,17 +182,17 @@ void Disk::SyncAll() {
   for (Node& node : nodes_) Commit(node, node.pending.size());
 }
 
-void Disk::CutPower(std::mt19937& random) {
+void Disk::CutPower(Chance& chance) {
   constexpr unsigned kEverything = 0;
   constexpr unsigned kNothing = 1;
-  const unsigned long luck = random() % 4;
+  const std::size_t luck = chance.Below(4);
   for (Node& node : nodes_) {
     if (luck == kEverything) {
       Commit(node, node.pending.size());
     } else if (luck == kNothing) {
       Commit(node, 0);
     } else {
-      CommitSome(node, random);
+      CommitSome(node, chance);
     }
   }
 }

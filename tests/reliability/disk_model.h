@@ -20,6 +20,38 @@
 
 namespace test {
 
+// Decides what is left to chance.
+class Chance {
+ public:
+  virtual ~Chance() = default;
+  virtual std::size_t Below(std::size_t n) = 0;
+};
+
+class Luck : public Chance {
+ public:
+  explicit Luck(unsigned seed) : random_(seed) {}
+  std::size_t Below(std::size_t n) override { return random_() % n; }
+
+ private:
+  std::mt19937 random_;
+};
+
+// Everything that may happen, one thing after the other: what asks it is done again and again, for
+// as long as Next returns true, and must ask the same after the same answers.
+class EveryChance : public Chance {
+ public:
+  std::size_t Below(std::size_t n) override;
+  bool Next();
+
+ private:
+  struct Answer {
+    std::size_t given;
+    std::size_t below;
+  };
+  std::vector<Answer> answers_;
+  std::size_t asked_ = 0;
+};
+
 struct DiskAct {
   DiskRecord record;
   std::string name;
@@ -41,8 +73,8 @@ class Disk {
   // Everything that was done is on disk.
   void SyncAll();
 
-  // The power is cut: of what is not durable some is there and some is not, as `random` has it.
-  void CutPower(std::mt19937& random);
+  // The power is cut: of what is not durable some is there and some is not, as `chance` has it.
+  void CutPower(Chance& chance);
 
   // Writes what is on disk below a directory that is not there yet.
   void WriteTo(const std::filesystem::path& root) const;
@@ -64,7 +96,7 @@ class Disk {
   void Defer(std::uint64_t inode, const DiskAct& act, std::size_t made = 0);
   static void CarryOut(Node& node, const DiskAct& act, std::size_t made);
   static void Commit(Node& node, std::size_t acts);
-  static void CommitSome(Node& node, std::mt19937& random);
+  static void CommitSome(Node& node, Chance& chance);
   void WriteNode(std::size_t node, const std::filesystem::path& path) const;
   void DescribeNode(std::size_t node, const std::string& path, std::string& text) const;
 

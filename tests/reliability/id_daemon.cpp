@@ -27,11 +27,12 @@ constexpr char kCommitted[] = "committed";  // the test's own command
   throw std::runtime_error(std::string(what) + ": " + std::strerror(errno));
 }
 
-int Socket(int (*attach)(int, const sockaddr*, socklen_t)) {
+int Socket(const std::string& path, int (*attach)(int, const sockaddr*, socklen_t)) {
   const int fd = socket(AF_UNIX, SOCK_STREAM | SOCK_CLOEXEC, 0);
   sockaddr_un address{};
   address.sun_family = AF_UNIX;
-  std::strcpy(address.sun_path, kSocket);
+  if (path.size() >= sizeof(address.sun_path)) throw std::runtime_error("too long: " + path);
+  std::strcpy(address.sun_path, path.c_str());
   if (fd < 0 || attach(fd, reinterpret_cast<sockaddr*>(&address), sizeof(address)) != 0) {
     Fail("the socket of the daemon of ids");
   }
@@ -99,8 +100,8 @@ class Server {
 
 }  // namespace
 
-IdDaemon::IdDaemon() {
-  const int listener = Socket(bind);
+IdDaemon::IdDaemon(const std::string& root) : socket_(root + kSocket) {
+  const int listener = Socket(socket_, bind);
   if (listen(listener, SOMAXCONN) != 0) Fail("the daemon of ids cannot listen");
   process_ = fork();
   if (process_ < 0) Fail("the daemon of ids cannot be started");
@@ -118,11 +119,11 @@ IdDaemon::IdDaemon() {
 IdDaemon::~IdDaemon() {
   kill(process_, SIGKILL);
   waitpid(process_, nullptr, 0);
-  unlink(kSocket);
+  unlink(socket_.c_str());
 }
 
-std::map<std::string, std::set<std::string>> IdDaemon::Committed() {
-  const int fd = Socket(connect);
+std::map<std::string, std::set<std::string>> IdDaemon::Committed() const {
+  const int fd = Socket(socket_, connect);
   std::string text;
   const bool answered =
       host::SendFrame(fd, std::string(R"({"command":")") + kCommitted + R"("})") &&

@@ -5,7 +5,9 @@
 #include <unistd.h>
 
 #include <cstdlib>
+#include <set>
 #include <stdexcept>
+#include <utility>
 
 namespace test {
 
@@ -53,37 +55,85 @@ void PowerCut::EndRecording() {
   }
 }
 
-std::size_t PowerCut::BehindRemovalOf(const std::string& name) const {
+std::size_t PowerCut::BehindRemovalOf(const std::string& name, int times) const {
   std::size_t at = 0;
   for (const DiskAct& act : acts_) {
     at += BytesOf(act);
-    if (act.record.kind == DiskRecord::kRemove && act.name == name) return at;
+    const bool removed = act.record.kind == DiskRecord::kRemove && act.name == name;
+    if (removed && --times == 0) return at;
   }
-  throw std::runtime_error("nobody has removed " + name);
+  throw std::runtime_error("nobody has so often removed " + name);
 }
 
-std::size_t PowerCut::Cut(
-    unsigned states, unsigned seed,
-    const std::function<bool(const fs::path& root, std::size_t at)>& reopen) const {
-  std::mt19937 random(seed);
-  std::set<std::size_t> different;
-  const fs::path root = place_.Path() / "root";
-  for (unsigned state = 0; state < states; ++state) {
+class PowerCut::States {
+ public:
+  explicit States(fs::path root) : root_(std::move(root)) {}
+
+  bool Reopened(const Disk& disk, std::size_t at, const Reopen& reopen) {
+    const std::size_t content = std::hash<std::string>()(disk.Describe());
+    contents_.insert(content);
+    if (!seen_.insert({content, at}).second) return true;
+    disk.WriteTo(root_);
+    const bool go_on = reopen(root_, at);
+    fs::remove_all(root_);
+    return go_on;
+  }
+
+  std::size_t Different() const { return contents_.size(); }
+
+ private:
+  const fs::path root_;
+  std::set<std::size_t> contents_;
+  std::set<std::pair<std::size_t, std::size_t>> seen_;
+};
+
+void PowerCut::ForEach(const std::function<bool(const Disk& disk, std::size_t at)>& look) const {
+  Disk done = before_;
+  std::size_t at = 0;
+  for (std::size_t acts = 0;; ++acts) {
+    EveryChance chance;
+    do {
+      Disk disk = done;
+      disk.CutPower(chance);
+      if (!look(disk, at)) return;
+    } while (chance.Next());
+    if (acts == acts_.size()) return;
+    done.Apply(acts_[acts]);
+    at += BytesOf(acts_[acts]);
+  }
+}
+
+std::size_t PowerCut::CountStates(std::size_t at_most) const {
+  std::set<std::string> contents;
+  ForEach([&](const Disk& disk, std::size_t) {
+    contents.insert(disk.Describe());
+    return contents.size() < at_most;
+  });
+  return contents.size();
+}
+
+std::size_t PowerCut::CutEverywhere(const Reopen& reopen) const {
+  States states(place_.Path() / "root");
+  ForEach([&](const Disk& disk, std::size_t at) { return states.Reopened(disk, at, reopen); });
+  return states.Different();
+}
+
+std::size_t PowerCut::Cut(std::size_t states, unsigned seed, const Reopen& reopen) const {
+  constexpr std::size_t kCutsForEach = 1000;
+  Luck luck(seed);
+  States reopened(place_.Path() / "root");
+  for (std::size_t cut = 0; cut < states * kCutsForEach && reopened.Different() < states; ++cut) {
     Disk disk = before_;
     std::size_t at = 0;
-    const std::size_t acts = random() % (acts_.size() + 1);
+    const std::size_t acts = luck.Below(acts_.size() + 1);
     for (std::size_t i = 0; i < acts; ++i) {
       disk.Apply(acts_[i]);
       at += BytesOf(acts_[i]);
     }
-    disk.CutPower(random);
-    different.insert(std::hash<std::string>()(disk.Describe()));
-    disk.WriteTo(root);
-    const bool go_on = reopen(root, at);
-    fs::remove_all(root);
-    if (!go_on) break;
+    disk.CutPower(luck);
+    if (!reopened.Reopened(disk, at, reopen)) break;
   }
-  return different.size();
+  return reopened.Different();
 }
 
 }  // namespace test

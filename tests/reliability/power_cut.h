@@ -5,7 +5,6 @@
 #include <filesystem>
 #include <functional>
 #include <memory>
-#include <set>
 #include <string>
 #include <vector>
 
@@ -47,18 +46,35 @@ class PowerCut {
 
   std::size_t Acts() const { return acts_.size(); }
 
-  // How far the record had come when the first entry of that name had been removed.
-  std::size_t BehindRemovalOf(const std::string& name) const;
+  // How far the record had come when an entry of that name had been removed so many times.
+  std::size_t BehindRemovalOf(const std::string& name, int times) const;
 
-  // Cuts the power `states` times, each time after a part of what was recorded, and writes what is
-  // then on disk below a directory, with which `reopen` is called, along with how far the record
-  // had come at the cut. Returns how many of the states differed from each other. Everything that
-  // is left to chance follows from the seed. Ends early when `reopen` returns false.
-  std::size_t Cut(
-      unsigned states, unsigned seed,
-      const std::function<bool(const std::filesystem::path& root, std::size_t at)>& reopen) const;
+  // Called with a directory that holds what is on disk after a power cut, and how far the record
+  // had come at the cut. Returns whether to go on.
+  using Reopen = std::function<bool(const std::filesystem::path& root, std::size_t at)>;
+
+  // How many states of the disk there can be that differ from each other; `at_most` when they are
+  // as many or more.
+  std::size_t CountStates(std::size_t at_most) const;
+
+  // Cuts the power behind each act of the record in every way there is, and reopens everything that
+  // can then be on disk. Returns how many states that were. Where they are few: acts that nothing
+  // makes durable multiply them.
+  std::size_t CutEverywhere(const Reopen& reopen) const;
+
+  // Cuts the power here and there until `states` states that differ from each other have been
+  // reopened, and returns how many they were: fewer when `reopen` ends it, or when a thousand times
+  // as many cuts do not bring forth as many. Everything that is left to chance follows from the
+  // seed.
+  std::size_t Cut(std::size_t states, unsigned seed, const Reopen& reopen) const;
 
  private:
+  // Tells them apart by what is on disk. The same one is reopened for each moment of the cut, as
+  // more may be asked of a later one.
+  class States;
+
+  void ForEach(const std::function<bool(const Disk& disk, std::size_t at)>& look) const;
+
   const std::filesystem::path root_;
   const TemporaryDirectory place_;
   const Disk before_;

@@ -1,5 +1,6 @@
 // One act of the library or of a writer of the queue in a device root, as a program of its own.
-//   power_cut_subject ROOT enqueue PATH | process | save VERSION
+//   power_cut_subject ROOT enqueue PATH | process PATH | save VERSION
+// While the batch is being carried out, another request comes, for PATH.
 #include <cstdio>
 #include <exception>
 #include <string>
@@ -7,14 +8,20 @@
 #include "appindex/config.h"
 #include "appindex/index_mgr.h"
 #include "host/device_root.h"
+#include "tests/support/controlled_time.h"
 #include "tool/queue_writer.h"
 
 namespace {
 
+void Enqueue(const std::string& path) { tool::AppendToQueue({tool::QueueRequest(1, path)}); }
+
 void Run(const std::string& act, const std::string& argument) {
   if (act == "enqueue") {
-    tool::AppendToQueue({tool::QueueRequest(1, argument)});
+    Enqueue(argument);
   } else if (act == "process") {
+    test::Time().on_usleep = [&](unsigned) {
+      if (test::Time().usleeps.size() == 1) Enqueue(argument);
+    };
     velkor::appindex::ProcessQueue();
   } else {
     velkor::appindex::Config config;
