@@ -1,6 +1,8 @@
 #include <algorithm>
 #include <cctype>
+#include <cerrno>
 #include <iterator>
+#include <limits>
 #include <set>
 #include <sstream>
 #include <utility>
@@ -9,6 +11,7 @@
 #include "appindex/utilities/file_utils.h"
 #include "appindex/utils_internal.h"
 #include "common/dir_reader.h"
+#include "common/file_io.h"
 #include "tool/lint/checks.h"
 
 namespace tool::lint {
@@ -171,7 +174,30 @@ void ReportAbsent(Report& report, const Texts& texts, const RootUse& root) {
   report.Add("language-absent", root.entry, what, absent);
 }
 
+// Whether nobody meant the file to hold texts: there is none, or nothing but comments in it.
+bool IsMeantToBeEmpty(const std::string& file) {
+  std::string content;
+  if (!velkor::ReadRegularFile(file, std::numeric_limits<std::size_t>::max(), content)) {
+    return errno == ENOENT || errno == ENOTDIR;
+  }
+  std::istringstream lines(content);
+  for (std::string line; std::getline(lines, line);) {
+    const std::size_t first = line.find_first_not_of(" \t\r");
+    if (first != std::string::npos && line[first] != '#' && line[first] != ';') return false;
+  }
+  return true;
+}
+
+void ReportUnread(Report& report, const Texts& texts, const RootUse& root) {
+  for (const std::string& lang : GetSupportedLangs()) {
+    const std::string file = root.root + lang + "/strings";
+    if (texts.HasLanguage(lang) || IsMeantToBeEmpty(file)) continue;
+    report.Add("texts-unread", root.entry, DisplayPath(file) + " gives no texts", {lang});
+  }
+}
+
 void ReportLanguages(Report& report, const Texts& texts, const RootUse& root) {
+  ReportUnread(report, texts, root);
   if (texts.Sections().empty()) return;  // every reference is unresolved
   if (texts.HasLanguage(kEnglish)) {
     ReportAbsent(report, texts, root);

@@ -123,6 +123,10 @@ const std::vector<Tag> kTextTags = {
      "Below the texts root only the directories of the 21 language codes are read.\n"
      "Correct the name, such as \"ger\" and not \"deu\", or move what else it is to\n"
      "another place."},
+    {"texts-unread", kWarning, false, "A file of texts gives none.",
+     "It is longer than 1 MiB, is no regular file, may not be read, or has no line\n"
+     "key=\"text\" below a line [section]. The language counts as one without texts.\n"
+     "Make the file shorter, or correct it."},
     {"texts-not-found", kError, false, "The package's texts are not found.",
      "References are looked up in the directory that \"stringset\" names beside the\n"
      "descriptor, or else in the first directory \"texts\" in the package or up to\n"

@@ -31,7 +31,8 @@ TEST(Tags, PublishedOnesAreThere) {
                            "texts-not-found",      "texts-ambiguous",   "texts-beyond-reach",
                            "descriptor-missing",   "descriptor-second", "descriptor-beyond-reach",
                            "descriptor-name",      "package-docuvault", "package-unknown",
-                           "nul-character",        "text-too-long",     "descriptor-unreadable"}) {
+                           "nul-character",        "text-too-long",     "descriptor-unreadable",
+                           "texts-unread"}) {
     EXPECT_NE(FindTag(name), nullptr) << name;
   }
 }

@@ -46,6 +46,18 @@ TEST_F(LintTest, EnglishMissingAltogetherIsSaidOnce) {
   EXPECT_THAT(Find("english-missing"), ElementsAre(Is("english-missing", "")));
 }
 
+TEST_F(LintTest, TextsUnread) {
+  const std::string texts = "[app]\ntitle=\"T\"\ndesc=\"D\"\nkw=\"K\"\n";
+  WriteTexts("fre", "");
+  WriteTexts("ger", texts + std::string(1024 * 1024, '#'));
+  WriteTexts("ita", "title=\"T\"\n");
+  const auto found = Find("texts-unread");
+  ASSERT_THAT(found, ElementsAre(Is("texts-unread", ""), Is("texts-unread", "")));
+  EXPECT_THAT(found[0].message, HasSubstr("ger/strings gives no texts"));
+  EXPECT_THAT(found[0].languages, ElementsAre("ger"));
+  EXPECT_THAT(found[1].languages, ElementsAre("ita"));
+}
+
 TEST_F(LintTest, SectionMissing) {
   WriteTexts("ger", "[app]\ntitle=\"T\"\ndesc=\"D\"\nkw=\"K\"\n");
   WriteTexts("fre", "[app]\ntitle=\"T\"\ndesc=\"D\"\nkw=\"K\"\n");
