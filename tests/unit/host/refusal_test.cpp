@@ -84,7 +84,7 @@ TEST_F(FrameRefusalTest, CallsThatFailAreFailures) {
   EXPECT_EQ(errno, ENOBUFS);
   // At first, in the header, and behind it.
   const std::string frame = host::FrameHeader(7) + "message";
-  for (const std::size_t arrived : {0, 3, 4}) {
+  for (const std::size_t arrived : {0u, 3u, 4u}) {
     ASSERT_EQ(send(ends_[0], frame.data(), arrived, 0), static_cast<ssize_t>(arrived));
     faults.recv.Arm(ECONNRESET, arrived == 0 ? 0 : 1);
     std::string message = "before";
