@@ -48,14 +48,14 @@ void CommitAll(const Texts& texts) {
 // Writes one application again and commits it, language by language, as its installation does.
 double SecondsOfCommit(const Texts& texts, std::size_t application) {
   const std::vector<std::string> requests = UpsertRequests(texts, application, application + 1);
-  std::vector<double> seconds;
+  Answers commits;
   for (std::size_t lang = 0; lang < texts.Langs().size(); ++lang) {
     for (std::size_t item = 0; item < kItemsPerApplication; ++item) {
       Ask(requests[lang * kItemsPerApplication + item]);
     }
-    seconds.push_back(SecondsOf([&] { elastic::IndexCommit(texts.Langs()[lang]); }));
+    commits.seconds.push_back(SecondsOf([&] { elastic::IndexCommit(texts.Langs()[lang]); }));
   }
-  return Median(seconds);
+  return commits.SecondsWithin(0.5);
 }
 
 // Writes until it goes out of scope.
@@ -157,12 +157,12 @@ BusySearches SearchBusyDaemon(const Texts& texts, std::size_t applications,
 }
 
 double SecondsOfEmptySearch(const Texts& texts) {
-  std::vector<double> seconds;
+  Answers answers;
   const std::string request = SearchRequest(texts.Langs().front(), "");
   for (std::size_t i = 0; i < kEmptySearches; ++i) {
-    seconds.push_back(SecondsOf([&] { Ask(request); }));
+    answers.seconds.push_back(SecondsOf([&] { Ask(request); }));
   }
-  return Median(seconds);
+  return answers.SecondsWithin(0.5);
 }
 
 }  // namespace bench

@@ -24,7 +24,8 @@ bool FailWith(int error) {
 }
 
 bool IsRegular(const struct stat& info) {
-  return S_ISREG(info.st_mode) || FailWith(S_ISDIR(info.st_mode) ? EISDIR : EINVAL);
+  if (S_ISREG(info.st_mode)) return true;
+  return FailWith(S_ISDIR(info.st_mode) ? EISDIR : EINVAL);
 }
 
 bool WriteAll(int fd, const std::string& content) {
