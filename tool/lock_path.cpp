@@ -79,7 +79,7 @@ LockPath LookAtLock(const std::string& path, const Protection& protection) {
 std::string WhyNotOpened(const LockPath& lock) {
   switch (lock.state) {
     case LockPath::kOpens:
-      return "";
+      break;
     case LockPath::kFails:
       return std::strerror(lock.error);
     case LockPath::kProtected:

@@ -342,6 +342,18 @@ TEST_F(CredentialsTest, TheSavedUserIsAWayToRoot) {
   });
 }
 
+TEST_F(CredentialsTest, TheUserWithAnothersGroupIsNotTheUserYet) {
+  RunInRoot(root_, [] {
+    ASSERT_EQ(setgroups(0, nullptr), 0);
+    ASSERT_EQ(setresgid(61101, 61101, 61101), 0);
+    ASSERT_EQ(setresuid(kAliceUid, kAliceUid, kAliceUid), 0);
+    const Identity before;
+    EXPECT_FALSE(ResetCredentialsByName("alice", true));
+    EXPECT_EQ(TLIBCErrGet(), EPERM);
+    EXPECT_TRUE(Identity() == before);
+  });
+}
+
 TEST_F(CredentialsTest, WithoutAWayToRootNoOtherUserCanBeHad) {
   RunInRoot(root_, [] {
     ASSERT_EQ(setgroups(0, nullptr), 0);

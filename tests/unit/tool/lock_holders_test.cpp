@@ -172,6 +172,8 @@ TEST_F(MadeUpProc, TheTakerIsNamedThatDoesNotShowItsFiles) {
   dir_.Write("proc/12/comm", "package-manager\n");
   dir_.Write("proc/12/fd", "");  // is no directory that may be read
   EXPECT_THAT(Holders(Line(12)), ElementsAre(IsHolder(12, "package-manager", false)));
+  dir_.Write("proc/12/comm", "without-a-line-feed");
+  EXPECT_THAT(Holders(Line(12)), ElementsAre(IsHolder(12, "without-a-line-feed", false)));
 }
 
 TEST_F(MadeUpProc, OthersThatDoNotShowTheirFilesAreNotTakenForHolders) {

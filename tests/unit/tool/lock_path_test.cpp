@@ -111,6 +111,16 @@ INSTANTIATE_TEST_SUITE_P(
                             MakeLink("/link");
                             ASSERT_EQ(symlink("/no/where", "/link"), 0);
                           }},
+                    Place{"AsManyLinksAsMayBe",
+                          [] {
+                            MakeLink("/link39");
+                            for (int i = 39; i > 0; --i) {
+                              const std::string target = i > 1 ? "/link" + std::to_string(i - 1)
+                                                               : std::string("/tmp/made");
+                              const std::string link = "/link" + std::to_string(i);
+                              ASSERT_EQ(symlink(target.c_str(), link.c_str()), 0);
+                            }
+                          }},
                     Place{"LinkToItself", [] { MakeLink("work.lck"); }},
                     Place{"FileOfAnother", MakeForeign, 0, true},
                     Place{"FileOfOnesOwn", MakeForeign, kAnna, true},
@@ -162,6 +172,14 @@ TEST_F(LockPathTest, FilesOfTheDirectorysOwnerAreNotProtected) {
   EXPECT_EQ(LookAtLock(kPath, {2, 2}).state, LockPath::kOpens);
 }
 
+TEST_F(LockPathTest, FilesOfOnesOwnAreNotProtected) {
+  if (!test::IsTrueRoot()) GTEST_SKIP() << "needs root: becomes another user";
+  MakeForeign();
+  ASSERT_EQ(seteuid(kAnna), 0);
+  EXPECT_EQ(LookAtLock(kPath, {2, 2}).state, LockPath::kOpens);
+  ASSERT_EQ(seteuid(0), 0);
+}
+
 TEST_F(LockPathTest, SettingsAreReadAndWithoutThemThereAreNone) {
   test::WriteFile("/proc/sys/fs/protected_regular", "2\n");
   test::WriteFile("/proc/sys/fs/protected_fifos", "1\n");
@@ -169,6 +187,9 @@ TEST_F(LockPathTest, SettingsAreReadAndWithoutThemThereAreNone) {
   EXPECT_EQ(ReadProtection(proc.Get()).regular, 2);
   EXPECT_EQ(ReadProtection(proc.Get()).fifos, 1);
   EXPECT_EQ(ReadProtection(-1).regular, 0);
+  test::MakeDirs("/elsewhere/sys/fs/protected_regular");
+  const velkor::UniqueFd elsewhere(open("/elsewhere", O_RDONLY | O_DIRECTORY | O_CLOEXEC));
+  EXPECT_EQ(ReadProtection(elsewhere.Get()).regular, 0);
 }
 
 }  // namespace

@@ -9,6 +9,7 @@
 #include <unistd.h>
 
 #include <cerrno>
+#include <filesystem>
 #include <string>
 
 #include "appindex/index_mgr.h"
@@ -132,6 +133,40 @@ TEST_F(QueueLocks, WhatIsNoRegularFileIsNoQueue) {
     EXPECT_TRUE(test::Exists(kQueue));
     remove(kQueue);
   }
+}
+
+TEST_F(QueueLocks, WhatCannotBeALockIsToldWithWhatToDo) {
+  const std::string effect = ": nobody can work the queue, all requests wait; ";
+  ASSERT_EQ(symlink(kProcessLock, kProcessLock), 0);
+  EXPECT_EQ(ProcessLock()["problem"].asString(),
+            "Too many levels of symbolic links" + effect + "remove it: it is made anew");
+  EXPECT_EQ(test::ThrownBy(ProcessQueue).code, 506);
+
+  ASSERT_EQ(unlink(kProcessLock), 0);
+  ASSERT_EQ(mknod(kProcessLock, S_IFSOCK | 0600U, 0), 0);
+  EXPECT_EQ(ProcessLock()["problem"].asString(),
+            "No such device or address" + effect + "remove it: it is made anew");
+  EXPECT_EQ(test::ThrownBy(ProcessQueue).code, 506);
+
+  ASSERT_EQ(rename("/tmp", "/away"), 0);
+  EXPECT_EQ(ProcessLock()["problem"].asString(),
+            "No such file or directory" + effect + "make its directory");
+  EXPECT_EQ(test::ThrownBy(ProcessQueue).code, 506);
+
+  test::WriteFile("/tmp", "");
+  EXPECT_EQ(ProcessLock()["problem"].asString(),
+            "Not a directory" + effect + "see whether the path is right");
+  EXPECT_EQ(test::ThrownBy(ProcessQueue).code, 506);
+}
+
+TEST_F(QueueLocks, QueueThatCannotBeLookedAtCountsAsNone) {
+  const std::string dir = std::filesystem::path(kQueue).parent_path();
+  std::filesystem::remove_all(dir);
+  test::WriteFile(dir, "");
+  EXPECT_EQ(QueueLock()["problem"].asString(),
+            "Not a directory: whoever works the queue takes it for none, and does nothing; see "
+            "whether the path is right");
+  EXPECT_NO_THROW(ProcessQueue());
 }
 
 TEST_F(QueueLocks, BatchThatCannotBeBegunIsNotSaidToBeLeftForAnUnknownReason) {
