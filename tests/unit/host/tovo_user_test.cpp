@@ -342,11 +342,16 @@ TEST_F(CredentialsTest, TheSavedUserIsAWayToRoot) {
   });
 }
 
+// Without a way back to root.
+void BecomeAliceForGood(gid_t group) {
+  ASSERT_EQ(setgroups(0, nullptr), 0);
+  ASSERT_EQ(setresgid(group, group, group), 0);
+  ASSERT_EQ(setresuid(kAliceUid, kAliceUid, kAliceUid), 0);
+}
+
 TEST_F(CredentialsTest, TheUserWithAnothersGroupIsNotTheUserYet) {
   RunInRoot(root_, [] {
-    ASSERT_EQ(setgroups(0, nullptr), 0);
-    ASSERT_EQ(setresgid(61101, 61101, 61101), 0);
-    ASSERT_EQ(setresuid(kAliceUid, kAliceUid, kAliceUid), 0);
+    BecomeAliceForGood(61101);
     const Identity before;
     EXPECT_FALSE(ResetCredentialsByName("alice", true));
     EXPECT_EQ(TLIBCErrGet(), EPERM);
@@ -356,9 +361,7 @@ TEST_F(CredentialsTest, TheUserWithAnothersGroupIsNotTheUserYet) {
 
 TEST_F(CredentialsTest, WithoutAWayToRootNoOtherUserCanBeHad) {
   RunInRoot(root_, [] {
-    ASSERT_EQ(setgroups(0, nullptr), 0);
-    ASSERT_EQ(setresgid(61200, 61200, 61200), 0);
-    ASSERT_EQ(setresuid(kAliceUid, kAliceUid, kAliceUid), 0);
+    BecomeAliceForGood(61200);
     const Identity before;
     for (const char* name : {"root", "Velkor"}) {
       EXPECT_FALSE(ResetCredentialsByName(name, true)) << name;
