@@ -123,6 +123,18 @@ void SendCommand(const char* command, Json::Value data) {
   SendRequest(request);
 }
 
+std::string IdOf(const Json::Value& doc) {
+  std::string id;
+  GetStrictString(id, doc, "id", true);
+  return id;
+}
+
+// Put together as text: a Json::Value of the request would copy the whole document.
+std::string UpsertText(const std::string& lang, const std::string& doc_id, const Json::Value& doc) {
+  return R"({"command":"document_upsert_by_id","data":{"id":)" + toString(GetAppIndexID(lang)) +
+         R"(,"doc_id":)" + toString(doc_id) + R"(,"data":)" + toString(doc) + "}}";
+}
+
 }  // namespace
 
 void SendRequestImpl(Json::Value& response, const RequestText& request) {
@@ -188,18 +200,11 @@ void AppIndexCreate(const std::string& lang) {
 void AppIndexDelete(const std::string& lang) { SendCommand("index_delete", MakeData(lang)); }
 
 std::string UpsertRequest(const std::string& lang, const Json::Value& doc) {
-  std::string doc_id;
-  GetStrictString(doc_id, doc, "id", true);
-
-  // Put together as text: a Json::Value of the request would copy the whole document.
-  return R"({"command":"document_upsert_by_id","data":{"id":)" + toString(GetAppIndexID(lang)) +
-         R"(,"doc_id":)" + toString(doc_id) + R"(,"data":)" + toString(doc) + "}}";
+  return UpsertText(lang, IdOf(doc), doc);
 }
 
 void IndexUpsert(const std::string& lang, const Json::Value& doc) {
-  std::string doc_id;
-  GetStrictString(doc_id, doc, "id", true);  // before anything is sent
-  SendRequest([&] { return UpsertRequest(lang, doc); });
+  SendRequest([&, doc_id = IdOf(doc)] { return UpsertText(lang, doc_id, doc); });
 }
 
 void IndexDelete(const std::string& lang, const std::string& doc_id) {
