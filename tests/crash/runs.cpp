@@ -4,8 +4,6 @@
 #include <cstdlib>
 #include <cstring>
 #include <iostream>
-#include <map>
-#include <set>
 
 namespace test {
 namespace {
@@ -22,9 +20,7 @@ std::optional<std::size_t> NumberFrom(const char* name, std::optional<std::size_
 Runs Runs::FromEnvironment(const Runs& otherwise) {
   Runs runs;
   runs.kills = NumberFrom("CRASH_KILLS", otherwise.kills);
-  const char* const faults = std::getenv("CRASH_FAULTS");
-  runs.faults_by_kind = faults != nullptr && std::strcmp(faults, "kinds") == 0;
-  if (!runs.faults_by_kind) runs.faults = NumberFrom("CRASH_FAULTS", otherwise.faults);
+  runs.faults = NumberFrom("CRASH_FAULTS", otherwise.faults);
   runs.seed = NumberFrom("CRASH_SEED", otherwise.seed).value_or(otherwise.seed);
   std::cout << "CRASH_SEED=" << runs.seed << std::endl;
   return runs;
@@ -39,18 +35,6 @@ std::vector<std::size_t> Runs::Sample(std::size_t count, std::optional<std::size
   std::vector<std::size_t> chosen;
   for (std::size_t i = seed % every; i < count; i += every) chosen.push_back(i);
   return chosen;
-}
-
-std::vector<std::size_t> Runs::SampleOfKinds(const std::vector<std::string>& kinds) const {
-  std::map<std::string, std::vector<std::size_t>> of_kind;
-  for (std::size_t i = 0; i < kinds.size(); ++i) of_kind[kinds[i]].push_back(i);
-  std::set<std::size_t> chosen;
-  for (const auto& [kind, all] : of_kind) {
-    chosen.insert(all.front());
-    chosen.insert(all[seed % all.size()]);
-    chosen.insert(all.back());
-  }
-  return {chosen.begin(), chosen.end()};
 }
 
 void Tally::Print() const {

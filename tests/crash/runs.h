@@ -10,11 +10,10 @@
 namespace test {
 
 // None given means all. From the environment, where CRASH_KILLS and CRASH_FAULTS are "all" or about
-// how many, CRASH_FAULTS may be "kinds", and CRASH_SEED chooses which.
+// how many, and CRASH_SEED chooses which.
 struct Runs {
   std::optional<std::size_t> kills;
   std::optional<std::size_t> faults;
-  bool faults_by_kind = false;  // some of each kind, whatever `faults` says
   std::size_t seed = 1;
 
   // What the environment does not say is as in `otherwise`.
@@ -23,9 +22,6 @@ struct Runs {
   // Which of `count` things are done when about `wanted` are: evenly spread, from an offset on that
   // the seed gives.
   std::vector<std::size_t> Sample(std::size_t count, std::optional<std::size_t> wanted) const;
-
-  // Of things of these kinds: the first and the last of each kind, and one in between.
-  std::vector<std::size_t> SampleOfKinds(const std::vector<std::string>& kinds) const;
 };
 
 struct Tally {

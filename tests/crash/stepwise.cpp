@@ -10,7 +10,6 @@
 #include <new>
 #include <utility>
 
-#include "appindex/device_identity.h"
 #include "appindex/error.h"
 #include "tests/crash/process_state.h"
 
@@ -68,19 +67,6 @@ void RunAndReport(const std::function<void()>& act) {
   report.kind = kind;
 }
 
-// Files that the work treats alike have the same: those of all languages, sockets whatever their
-// numbers.
-std::string KindOfFile(std::string path) {
-  for (const std::string& lang : velkor::appindex::GetSupportedLangs()) {
-    const std::string directory = "/" + lang + "/";
-    const std::size_t at = path.find(directory);
-    if (at != std::string::npos) path.replace(at, directory.size(), "/LANG/");
-  }
-  path.erase(std::remove_if(path.begin(), path.end(), [](char c) { return c >= '0' && c <= '9'; }),
-             path.end());
-  return path;
-}
-
 // In a process of its own: what the C library remembers in this one must not change the calls that
 // later runs make.
 void RunApart(const std::function<void()>& work) {
@@ -120,7 +106,7 @@ void Stepwise::Run() {
   }
   const std::vector<Injection> injections = Injections();
   tally_.possible = injections.size();
-  for (const std::size_t i : Chosen(injections)) {
+  for (const std::size_t i : runs_.Sample(injections.size(), runs_.faults)) {
     if (testing::Test::HasFailure()) return;
     Fail(injections[i]);
   }
@@ -235,16 +221,6 @@ std::vector<Stepwise::Injection> Stepwise::Injections() const {
     for (const Fault& fault : FaultsOf(points_[i].call)) injections.push_back({i, fault});
   }
   return injections;
-}
-
-std::vector<std::size_t> Stepwise::Chosen(const std::vector<Injection>& injections) const {
-  if (!runs_.faults_by_kind) return runs_.Sample(injections.size(), runs_.faults);
-  std::vector<std::string> kinds;
-  for (const Injection& injection : injections) {
-    const Point& point = points_[injection.point];
-    kinds.push_back(KindOfFile(point.path) + ": " + injection.fault.Text(point.call.number));
-  }
-  return runs_.SampleOfKinds(kinds);
 }
 
 }  // namespace test

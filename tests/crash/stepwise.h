@@ -62,7 +62,6 @@ class Stepwise {
   Outcome Trace(const Stepper::Decide& decide);
   std::vector<std::size_t> Picked() const;
   std::vector<Injection> Injections() const;
-  std::vector<std::size_t> Chosen(const std::vector<Injection>& injections) const;
 
   const Subject subject_;
   const Runs runs_;

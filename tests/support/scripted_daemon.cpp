@@ -139,6 +139,11 @@ std::vector<Json::Value> ScriptedDaemon::Requests() {
   return requests_;
 }
 
+void ScriptedDaemon::ForgetRequests() {
+  const std::lock_guard<std::mutex> lock(mutex_);
+  requests_.clear();
+}
+
 std::vector<std::string> ScriptedDaemon::Commands() {
   std::vector<std::string> commands;
   for (const Json::Value& request : Requests()) {

@@ -48,6 +48,8 @@ class ScriptedDaemon {
   // All requests read so far, in order. When a call of the library has returned, its requests are
   // in.
   std::vector<Json::Value> Requests();
+  // From now on without those read so far.
+  void ForgetRequests();
   // The same, each shortened to "command id" or "command id doc_id", such as
   // "document_upsert_by_id appindex_enu App".
   std::vector<std::string> Commands();
