@@ -1,5 +1,6 @@
 #include "tests/crash/daemon_stepwise.h"
 
+#include <linux/futex.h>
 #include <sys/stat.h>
 #include <sys/syscall.h>
 #include <unistd.h>
@@ -20,6 +21,8 @@ constexpr char kEnu[] = "appindex_enu";
 constexpr char kOld[] = "appindex_old";
 constexpr char kKept[] = "appindex_kept";
 constexpr char kWord[] = "xylophone";  // finds every document
+constexpr std::chrono::minutes kForEver(1);
+constexpr pid_t kNobody = -1;
 
 Json::Value Titled(const std::string& id) { return Document(id, kWord); }
 
@@ -35,8 +38,18 @@ bool WakesWhenAnswered(const Json::Value& request) {
   return IsBelow("index_", request["command"].asString());
 }
 
-bool ConcernsClients(const SystemCall& call) {
-  return call.number == SYS_bind || call.number == SYS_sendto || call.number == SYS_sendmsg;
+bool Sends(const SystemCall& call) {
+  return call.number == SYS_sendto || call.number == SYS_sendmsg;
+}
+
+bool ConcernsClients(const SystemCall& call) { return call.number == SYS_bind || Sends(call); }
+
+// Whether a thread waits for a request, or for something to do; but not for another's lock.
+bool Waits(const SystemCall& call) {
+#if defined(__x86_64__)
+  if (call.number == SYS_epoll_wait) return true;
+#endif
+  return call.number == SYS_futex && (call.arguments[1] & FUTEX_CMD_MASK) == FUTEX_WAIT_BITSET;
 }
 
 DaemonModel ModelOfBeginning() {
@@ -102,10 +115,12 @@ DaemonStepwise::Attempt DaemonStepwise::Run(const Stepper::Decide& decide, const
   asked_ = -1;
   may_be_idle_ = false;
   wakes_ = 0;
+  replier_ = kNobody;
   ended_ = false;
   std::thread tracer([&] {
     attempt.end = stepper_.Run([this] { Become(); },
                                [&](const SystemCall& call) {
+                                 NoteReplies(call);
                                  const std::optional<Step> step = StepOfIdleness(call);
                                  return step ? *step : decide(call);
                                });
@@ -160,6 +175,7 @@ void DaemonStepwise::Ask(const std::vector<Json::Value>& requests, const Course&
     }
     attempt.codes.push_back(CodeOfReplyTo(request));
     if (attempt.codes.back() == DaemonModel::kNoReply) return;
+    AwaitRest();
     if (!course.idles || !LeavesWork(request)) continue;
     if (WakesWhenAnswered(request) && !AwaitWakes(++wakes)) return;
     if (!LetIdle(++wakes)) return;
@@ -175,6 +191,22 @@ int DaemonStepwise::CodeOfReplyTo(const Json::Value& request) const {
 std::optional<std::size_t> DaemonStepwise::Asked() const {
   const int asked = asked_;
   return asked < 0 ? std::nullopt : std::optional(static_cast<std::size_t>(asked));
+}
+
+// A thread that has answered looks whether there is something to do while idle, and may find what
+// the next request has left if that comes before.
+void DaemonStepwise::NoteReplies(const SystemCall& call) {
+  const std::lock_guard lock(mutex_);
+  if (Sends(call)) replier_ = call.thread;
+  if (call.thread != replier_ || !Waits(call)) return;
+  replier_ = kNobody;
+  changed_.notify_all();
+}
+
+void DaemonStepwise::AwaitRest() {
+  std::unique_lock lock(mutex_);
+  EXPECT_TRUE(changed_.wait_for(lock, kForEver, [&] { return ended_ || replier_ == kNobody; }))
+      << "the thread that has answered does not wait";
 }
 
 // The daemon does what can wait when no request has come for two milliseconds. Here that time is
@@ -211,7 +243,6 @@ bool DaemonStepwise::LetIdle(std::size_t wakes) {
 }
 
 bool DaemonStepwise::AwaitWakes(std::size_t count) {
-  constexpr std::chrono::minutes kForEver(1);
   std::unique_lock lock(mutex_);
   EXPECT_TRUE(changed_.wait_for(lock, kForEver, [&] { return ended_ || wakes_ >= count; }))
       << "the daemon does not see that there is something to do";

@@ -76,6 +76,8 @@ class DaemonStepwise : public SearchdTest {
   void Ask(const std::vector<Json::Value>& requests, const Course& course, Attempt& attempt);
   void KeepFiles() const;
   int CodeOfReplyTo(const Json::Value& request) const;
+  void NoteReplies(const SystemCall& call);
+  void AwaitRest();
   std::optional<Step> StepOfIdleness(const SystemCall& call);
   bool LetIdle(std::size_t wakes);
   bool AwaitWakes(std::size_t count);
@@ -90,6 +92,7 @@ class DaemonStepwise : public SearchdTest {
   std::mutex mutex_;
   std::condition_variable changed_;
   std::size_t wakes_ = 0;  // of the daemon's waiting thread, by others of its threads
+  pid_t replier_ = -1;     // the thread that has sent a reply and does not wait yet, or -1
   bool ended_ = false;
 };
 
